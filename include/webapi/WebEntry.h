@@ -1,0 +1,85 @@
+#pragma once
+
+#include <json/value.h>
+
+#include <string>
+
+#include "APIRunner.h"
+#include "Export.h"
+
+struct ZovaCgi;
+
+namespace ZOVA {
+
+/**
+ * The CGI front end: the request comes from the process environment and standard input, the answer leaves on standard
+ * output. A host program makes one per HTTP request and calls `Run` once:
+ *
+ *     int main(int argc, char** argv) {
+ *         ZOVA::WebEntry entry;
+ *         entry.SetArgs(argc, argv);
+ *         entry.Run(Json::Value());
+ *     }
+ *
+ * The working directory must be the one of the description files. Whatever the client sent, a header block and a JSON
+ * body go out, unless the method switched the output off.
+ */
+class WEBAPI_EXPORT WebEntry : public APIRunner {
+public:
+    WebEntry();
+    ~WebEntry() override;
+
+    /** Serves the call; the argument is not looked at. */
+    void Run(const Json::Value& description) override;
+    bool Initialize(const Json::Value& description) override;
+
+    /** Login, device token or bearer token, kind of user, application privilege. Logs a failed token. */
+    bool CheckPermission(APIRequest* request, APIResponse* response) override;
+    /**
+     * The authorisation alone, on the process's own request, at most once per value of `allowTimeout`.
+     * @return 0 or the error number.
+     */
+    int CheckPermission(bool allowTimeout);
+    bool CheckSharingPermission(APIRequest* request, APIResponse* response) override;
+    /** False only for "authLevel" 0. */
+    bool NeedPermission(APIRequest* request) override;
+    /** True only for "authLevel" 2. */
+    bool SkipPermission(APIRequest* request) override;
+    bool HandleUpload(APIRequest* request, APIResponse* response) override;
+
+    /** Writes the header block to standard output. */
+    void OutputHeader();
+    /** Writes the body to standard output and flushes it. */
+    void OutputBody();
+    /** Removes the files that an upload left in a temporary directory. */
+    void RemoveTemporaryUploadFile();
+
+    // ---- parameter intake ----
+
+    /** Fills "getParam" and "postParam" of `out` from query string and body. */
+    bool InitParam(Json::Value& out);
+    bool InitGetParam(Json::Value& out);
+    /** Logs an exception caught while the body was read. */
+    bool InitPostParam(Json::Value& out);
+    /** Turns one line of pairs, enciphered or clear, into members of `out`. */
+    bool DetectAndDecryptParamLine(const std::string& line, Json::Value& out);
+    bool DecryptParam(const std::string& cipherText, Json::Value& out);
+    bool DecryptAESParam(Json::Value& params);
+    /** The first form fields of an upload, which name the API. */
+    bool LoadUploadAPIDesc(Json::Value& out);
+
+    /** Passes the call on to a peer device. */
+    bool ProcessRelay(APIRequest* request, APIResponse* response);
+
+private:
+    /** Lets the parameters "_sid", "tid", "_sharing_id" and "_sharing_sid" stand in for cookies and headers. */
+    bool TakeCredentialParameters();
+    /** Asks for the authorisation result and makes the session of the process's own request. */
+    int Authorize(bool allowTimeout);
+
+    Json::Value tempUploadFiles;
+    ZovaCgi* cgi;
+    Json::Value permCache;
+};
+
+}  // namespace ZOVA

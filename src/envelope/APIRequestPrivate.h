@@ -1,0 +1,74 @@
+#pragma once
+
+#include <json/value.h>
+
+#include <string>
+
+#include "webapi/APIBase.h"
+#include "webapi/APIParameter.h"
+#include "webapi/APIRequest.h"
+#include "zovasharing.h"
+
+namespace ZOVA {
+
+/** A call by its three names. */
+struct CallName {
+    std::string api;
+    int version = 0;
+    std::string method;
+};
+
+/** The nine sections of a request, and the sharing records that do not travel with them. */
+class APIRequestPrivate : public APIBase {
+public:
+    explicit APIRequestPrivate(APIRequest* owner);
+    APIRequestPrivate(const APIRequestPrivate& other, APIRequest* owner);
+    APIRequestPrivate(const APIRequestPrivate&) = delete;
+    APIRequestPrivate& operator=(const APIRequestPrivate&) = delete;
+    ~APIRequestPrivate() override;
+
+    /** The private object of a request, for the framework's own code. */
+    static APIRequestPrivate& Of(APIRequest& request) { return *request.d; }
+
+    /** Takes "api", "version" and "method" from parameters, each if present. */
+    void SetAPIDesc(const Json::Value& params);
+
+    /** Makes the request name exactly this call again, whatever parameters brought since. */
+    void SetCallName(const CallName& call);
+
+    /** A member of "private"; null where there is none. Asking creates it with null, which shows when serialised. */
+    Json::Value PrivateValue(const char* key);
+    void SetPrivateValue(const char* key, const Json::Value& value);
+
+    // Parsers of the environment. None logs.
+    void InitCookie();
+    void InitRequestMethod();
+    void InitURL();
+    bool ParseProtocol();
+    bool ParseHostAndPort();
+    bool ParsePathAndName();
+
+    void InitSharing();
+
+    /** Deciphers what is enciphered in a parameter object, in place. */
+    bool DecryptParam(Json::Value& params);
+
+    unsigned int GetLoginUID();
+
+    template <class T>
+    APIParameter<T> GetAndCheckParam(const std::string& key, bool required, Json::ValueType type,
+                                     typename APIParameter<T>::Validator validator) const;
+    APIParameter<Json::Value> GetAndCheckUnitArrayParam(const std::string& key, bool required,
+                                                        APIParameter<Json::Value>::Validator validator) const;
+
+    APIRequest* owner;
+    Json::Value spare;
+    std::string sharingId;
+    std::string sharingSid;
+    sharing::record::Entry sharingEntry;
+    sharing::record::Session sharingSession;
+    sharing::record::Token sharingToken;
+    sharing::_tag_SHARING_URL_TYPE sharingUrlType;
+};
+
+}  // namespace ZOVA
