@@ -106,7 +106,7 @@ Json::Value& APIRunner::ApplyLibDef(Json::Value& description) {
 }
 
 bool APIRunner::InitLibDesc(Json::Value& out, const std::string& api) {
-    if (api.empty()) {
+    if (api.empty() || !Json::isObject(out)) {
         return false;
     }
     if (Json::hasMember(out, api)) {
@@ -132,7 +132,7 @@ bool APIRunner::InitLibDesc(Json::Value& out, APIRequest* call) {
 
 bool APIRunner::InitLibDesc(Json::Value& out) {
     glob_t files{};
-    if (glob("*.lib", 0, nullptr, &files) != 0) {
+    if (!Json::isObject(out) || glob("*.lib", 0, nullptr, &files) != 0) {
         globfree(&files);
         return false;
     }

@@ -7,6 +7,7 @@
 #include <cerrno>
 #include <cstring>
 
+#include "base/ErrnoGuard.h"
 #include "base/Log.h"
 #include "zovacredentials.h"
 #include "zovasdk.h"
@@ -18,10 +19,12 @@ namespace {
 constexpr int kUnchanged = -1;
 
 void LogGain(const char* what, int real, int effective, int saved) {
+    base::ErrnoGuard errnoGuard;
     WEBAPI_LOG(LOG_AUTH | LOG_INFO, "WARNING: set%s(%d, %d, %d)", what, real, effective, saved);
 }
 
 void LogRefusal(const char* what, int real, int effective, int saved) {
+    base::ErrnoGuard errnoGuard;
     char text[1024] = "";
     const char* reason = strerror_r(errno, text, sizeof(text));
     WEBAPI_LOG(LOG_AUTH | LOG_ERR, "ERROR: set%s(%d, %d, %d) [%s]", what, real, effective, saved, reason);

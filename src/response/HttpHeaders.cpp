@@ -15,7 +15,8 @@ namespace ZOVA {
 
 namespace {
 
-/** The last second of the year 9999: what a four-digit year of a cookie's date can hold. */
+/** First second of the year 0 and last one of the year 9999: what a cookie's four-digit year can hold. */
+constexpr long long kEarliestExpiry = -62167219200;
 constexpr long long kLatestExpiry = 253402300799;
 
 long long ClientTime(const APIRequest* request) {
@@ -26,17 +27,18 @@ long long ClientTime(const APIRequest* request) {
     if (value.isString()) {
         return base::DecimalNumber(Json::asString(value)).value_or(0);
     }
-    if (value.isDouble() && !value.isInt64()) {
-        return value.asDouble() > 0 ? kLatestExpiry : 0;
+    if (value.isNumeric()) {
+        return static_cast<long long>(
+            std::clamp(value.asDouble(), static_cast<double>(kEarliestExpiry), static_cast<double>(kLatestExpiry)));
     }
     return Json::asInt64(value);
 }
 
 /** "; expires=" with the time `minutes` from now, kept within the dates that can be written. */
 std::string ExpiryAttribute(const APIRequest* request, long minutes) {
-    const long long start = std::clamp(ClientTime(request), -kLatestExpiry, kLatestExpiry);
+    const long long start = std::clamp(ClientTime(request), kEarliestExpiry, kLatestExpiry);
     const long long seconds = std::min<long long>(minutes, kLatestExpiry / 60) * 60;
-    const time_t expiry = static_cast<time_t>(std::clamp(start + seconds, 0LL, kLatestExpiry));
+    const time_t expiry = static_cast<time_t>(std::min(start + seconds, kLatestExpiry));
     struct tm utc {};
     char text[1024] = "";
     if (gmtime_r(&expiry, &utc) != nullptr) {
