@@ -1,0 +1,37 @@
+#pragma once
+
+// All fixed places that the reference libraries read or write. The prefix is empty on a device; the tests build the
+// same sources with a private root.
+
+#ifndef ZOVA_REFERENCE_ROOT
+#define ZOVA_REFERENCE_ROOT ""
+#endif
+
+// Where the modules opened at first use lie. Empty: in the folder "zova" beside this library.
+#ifndef ZOVA_REFERENCE_MODULES
+#define ZOVA_REFERENCE_MODULES ""
+#endif
+
+namespace reference::paths {
+
+constexpr const char* kRunDirectory = ZOVA_REFERENCE_ROOT "/run/zova";
+constexpr const char* kSessionDirectory = ZOVA_REFERENCE_ROOT "/run/zova/sessions";
+constexpr const char* kLoginFailureDirectory = ZOVA_REFERENCE_ROOT "/run/zova/login-failures";
+
+constexpr const char* kSecretDirectory = ZOVA_REFERENCE_ROOT "/etc/zova";
+constexpr const char* kSecretLock = ZOVA_REFERENCE_ROOT "/etc/zova/.lock";
+constexpr const char* kEnvelopeKey = ZOVA_REFERENCE_ROOT "/etc/zova/envelope-key.pem";
+constexpr const char* kDeviceSecret = ZOVA_REFERENCE_ROOT "/etc/zova/device-secret";
+constexpr const char* kAppPrivileges = ZOVA_REFERENCE_ROOT "/etc/zova/app-privileges.json";
+constexpr const char* kWebServer = ZOVA_REFERENCE_ROOT "/etc/zova/web-server.json";
+
+constexpr const char* kDeviceInformation = ZOVA_REFERENCE_ROOT "/etc/zovainfo.conf";
+constexpr const char* kGroupDirectory = ZOVA_REFERENCE_ROOT "/var/lib/zova/groups";
+// Null: wherever the system keeps its PAM services.
+constexpr const char* kPamDirectory = sizeof(ZOVA_REFERENCE_ROOT) > 1 ? ZOVA_REFERENCE_ROOT "/etc/pam.d" : nullptr;
+
+constexpr const char* kModuleDirectory = ZOVA_REFERENCE_MODULES;
+constexpr const char* kCryptoModule = "zova-crypto.so";
+constexpr const char* kLoginModule = "zova-login.so";
+
+}  // namespace reference::paths
