@@ -1,0 +1,27 @@
+# Compares what the library exports with the checked-in list: a package built against an older library relies on each
+# line of it. A symbol that goes, or comes unnoticed, fails; the list is changed by hand, on purpose.
+# Of the weak symbols only the instances of the parameter templates count, which the library promises to hold; whether a
+# compiler emits others depends on how it optimises.
+execute_process(COMMAND ${NM} -D --defined-only ${LIBRARY} OUTPUT_VARIABLE text COMMAND_ERROR_IS_FATAL ANY)
+string(REGEX MATCHALL "[^\n]+" lines "${text}")
+set(exported "")
+foreach(line IN LISTS lines)
+    if(line MATCHES " [TDRB] ([^ ]+)$")
+        list(APPEND exported ${CMAKE_MATCH_1})
+    elseif(line MATCHES " W (_ZNK?4ZOVA(12APIParameterI|27APIParameterFactoryBasicImplI|10APIRequest19GetAndCheck)[^ ]+)$")
+        list(APPEND exported ${CMAKE_MATCH_1})
+    endif()
+endforeach()
+list(SORT exported)
+file(STRINGS ${LIST} listed)
+set(missing ${listed})
+set(unlisted ${exported})
+list(REMOVE_ITEM missing ${exported})
+list(REMOVE_ITEM unlisted ${listed})
+list(LENGTH exported count)
+if(count EQUAL 0 OR missing OR unlisted)
+    list(JOIN missing "\n  " missing)
+    list(JOIN unlisted "\n  " unlisted)
+    message(FATAL_ERROR "${count} symbols exported.\nListed, but not exported:\n  ${missing}\nExported, but not listed:\n  ${unlisted}")
+endif()
+message("${count} symbols, all listed")
