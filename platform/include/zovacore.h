@@ -27,5 +27,11 @@ int QLIBCConfGetZELMTimeout();
  * @return as fork.
  */
 int QLIBCProcFork();
+/**
+ * Forks a child that never holds the client's connection nor writes to it: its descriptors 0 to 2 are /dev/null, and
+ * copies of the connection are closed. With the flags 65 the child is nobody's to wait for and leaves no zombie.
+ * @return as fork; -1 on failure.
+ */
+int QLIBCProcForkEx(int flags);
 
 }  // extern "C"
