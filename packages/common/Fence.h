@@ -1,8 +1,7 @@
 #pragma once
 
-#include <webapi/APIResponse.h>
-
 #include <syslog.h>
+#include <webapi/APIResponse.h>
 
 #include <exception>
 
@@ -15,14 +14,16 @@ namespace package {
 template <class Body>
 void Fenced(const char* name, ZOVA::APIResponse* response, Body&& body) noexcept {
     try {
-        try {
-            body();
-        } catch (const std::exception& problem) {
-            syslog(LOG_ERR, "%s: %s", name, problem.what());
-            response->SetError(ZOVA::WEBAPI_ERR_INTERNAL, Json::Value());
-        }
+        body();
+        return;
+    } catch (const std::exception& problem) {
+        syslog(LOG_ERR, "%s: %s", name, problem.what());
     } catch (...) {
-        // Not even the error could be set, for want of memory: the answer that stands is the framework's own 117.
+        syslog(LOG_ERR, "%s: threw what is no std::exception", name);
+    }
+    try {
+        response->SetError(ZOVA::WEBAPI_ERR_INTERNAL, Json::Value());
+    } catch (...) {
         syslog(LOG_ERR, "%s: no answer could be made", name);
     }
 }
