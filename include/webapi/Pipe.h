@@ -31,6 +31,11 @@ public:
     void WriteOnly(int target);
     /** Closes both ends. */
     void Close();
+    /**
+     * Closes the ends of every pipe that this process holds, for a forked child that outlives the call: it must not
+     * keep another process waiting for the end of a pipe.
+     */
+    static void CloseInherited();
     /** Whether the end for reading is open. */
     bool IsReadable() const;
 

@@ -17,6 +17,9 @@ namespace reference::paths {
 constexpr const char* kRunDirectory = ZOVA_REFERENCE_ROOT "/run/zova";
 constexpr const char* kSessionDirectory = ZOVA_REFERENCE_ROOT "/run/zova/sessions";
 constexpr const char* kLoginFailureDirectory = ZOVA_REFERENCE_ROOT "/run/zova/login-failures";
+constexpr const char* kTaskDirectory = ZOVA_REFERENCE_ROOT "/run/zova/tasks";
+/** Beside the folder and not in it, since everybody may create files there. */
+constexpr const char* kTaskSweepStamp = ZOVA_REFERENCE_ROOT "/run/zova/tasks.swept";
 
 constexpr const char* kSecretDirectory = ZOVA_REFERENCE_ROOT "/etc/zova";
 constexpr const char* kSecretLock = ZOVA_REFERENCE_ROOT "/etc/zova/.lock";

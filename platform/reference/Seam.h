@@ -10,6 +10,7 @@
 #include <string>
 
 #pragma GCC visibility push(default)
+#include "taskmanager.h"
 #include "webapiutil.h"
 #include "zovaaccesstoken.h"
 #include "zovacgi.h"

@@ -12,6 +12,7 @@
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
 #include "webapi/Json.h"
+#include "webapi/Pipe.h"
 #include "webapiutil.h"
 #include "zovacore.h"
 #include "zovasdk.h"
@@ -195,6 +196,7 @@ void APIRunner::HandleCallback(APIResponse* answer) {
     if (callbacks == nullptr || callbacks->empty() || QLIBCProcFork() != 0) {
         return;
     }
+    Pipe::CloseInherited();
     setsid();
     sleep(1);
     const bool restricted = ZOVA_aa_has_profile_restricted() != 0;

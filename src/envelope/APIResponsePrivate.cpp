@@ -1,5 +1,7 @@
 #include "envelope/APIResponsePrivate.h"
 
+#include "taskmanager.h"
+#include "webapi/APIRequest.h"
 #include "webapi/Json.h"
 
 namespace ZOVA {
@@ -14,9 +16,14 @@ APIResponsePrivate::APIResponsePrivate(APIRequest* answeredRequest, APIResponse*
     SetData("headers", "Content-type", "application/json; charset=\"UTF-8\"", true);
 }
 
-APIResponsePrivate::~APIResponsePrivate() = default;
+APIResponsePrivate::~APIResponsePrivate() { delete task; }
 
 void APIResponsePrivate::SetOutcome(int code, const Json::Value& extra) {
+    if (task == nullptr && request != nullptr && request->IsPollingTask()) {
+        const std::string owner = Json::asString(request->GetEnv("task_user", ""));
+        const std::string id = Json::asString(request->GetEnv("task_id", ""));
+        task = new ZELM::Task(owner.c_str(), id.c_str());
+    }
     Json::Value body(Json::objectValue);
     body["success"] = code == 0;
     if (code != 0) {
@@ -33,6 +40,12 @@ void APIResponsePrivate::SetOutcome(int code, const Json::Value& extra) {
     }
     data["code"] = code;
     data["body"].swap(body);
+    if (task != nullptr) {
+        task->beginUpdate();
+        task->setProperty("body", data["body"]);
+        task->setProperty("task_run", true);
+        task->endUpdate();
+    }
 }
 
 }  // namespace ZOVA

@@ -3,11 +3,13 @@
 #include <fcntl.h>
 #include <unistd.h>
 
+#include <algorithm>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <memory>
 #include <string>
+#include <vector>
 
 #include "base/ErrnoGuard.h"
 #include "base/Log.h"
@@ -29,11 +31,19 @@ void CloseEnd(int& fd) {
     }
 }
 
+/** The pipes that have been opened and not destroyed; made at the first one. */
+std::vector<Pipe*>* openPipes = nullptr;
+
 }  // namespace
 
 Pipe::Pipe() : readFd(-1), writeFd(-1) {}
 
-Pipe::~Pipe() { Close(); }
+Pipe::~Pipe() {
+    Close();
+    if (openPipes != nullptr) {
+        openPipes->erase(std::remove(openPipes->begin(), openPipes->end(), this), openPipes->end());
+    }
+}
 
 bool Pipe::Init() {
     int ends[2] = {-1, -1};
@@ -42,6 +52,10 @@ bool Pipe::Init() {
     }
     readFd = ends[0];
     writeFd = ends[1];
+    if (openPipes == nullptr) {
+        openPipes = new std::vector<Pipe*>();
+    }
+    openPipes->push_back(this);
     return true;
 }
 
@@ -62,6 +76,12 @@ void Pipe::WriteOnly(int target) {
 void Pipe::Close() {
     ReadOnly(-1);
     WriteOnly(-1);
+}
+
+void Pipe::CloseInherited() {
+    if (openPipes != nullptr) {
+        std::for_each(openPipes->begin(), openPipes->end(), [](Pipe* pipe) { pipe->Close(); });
+    }
 }
 
 bool Pipe::IsReadable() const { return readFd >= 0; }

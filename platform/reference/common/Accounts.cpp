@@ -23,23 +23,36 @@ bool WithBuffer(Query query) {
     return error == 0;
 }
 
-}  // namespace
-
-std::optional<Account> FindAccount(const char* name) {
+template <typename Query>
+std::optional<Account> QueryAccount(Query query) {
     std::optional<Account> account;
-    if (name == nullptr || *name == '\0') {
-        return account;
-    }
     const bool asked = WithBuffer([&](char* buffer, size_t size) {
         struct passwd entry;
         struct passwd* found = nullptr;
-        const int error = getpwnam_r(name, &entry, buffer, size, &found);
+        const int error = query(&entry, buffer, size, &found);
         if (error == 0 && found != nullptr) {
             account = Account{entry.pw_uid, entry.pw_gid, entry.pw_name, entry.pw_dir};
         }
         return error;
     });
     return asked ? account : std::nullopt;
+}
+
+}  // namespace
+
+std::optional<Account> FindAccount(const char* name) {
+    if (name == nullptr || *name == '\0') {
+        return std::nullopt;
+    }
+    return QueryAccount([name](struct passwd* entry, char* buffer, size_t size, struct passwd** found) {
+        return getpwnam_r(name, entry, buffer, size, found);
+    });
+}
+
+std::optional<Account> FindAccountOf(uid_t uid) {
+    return QueryAccount([uid](struct passwd* entry, char* buffer, size_t size, struct passwd** found) {
+        return getpwuid_r(uid, entry, buffer, size, found);
+    });
 }
 
 std::optional<Group> FindGroup(const char* name) {

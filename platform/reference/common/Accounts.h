@@ -18,6 +18,9 @@ struct Account {
 /** The account in the system's user database. Nothing for an unknown one, and when the database cannot be asked. */
 std::optional<Account> FindAccount(const char* name);
 
+/** The account of a user id, likewise. */
+std::optional<Account> FindAccountOf(uid_t uid);
+
 struct Group {
     gid_t gid;
     std::vector<std::string> members;

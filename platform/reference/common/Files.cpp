@@ -24,6 +24,33 @@ bool IsTrusted(const struct stat& status, FileTrust trust) {
     return false;
 }
 
+}  // namespace
+
+bool ReadAll(int descriptor, size_t limit, std::string& content) {
+    struct stat status;
+    if (fstat(descriptor, &status) != 0 || status.st_size < 0 || static_cast<size_t>(status.st_size) > limit) {
+        return false;
+    }
+    // One byte more than the file claims to have, so that one that grows meanwhile is noticed.
+    content.resize(static_cast<size_t>(status.st_size) + 1);
+    size_t length = 0;
+    while (length < content.size()) {
+        const ssize_t got = read(descriptor, &content[length], content.size() - length);
+        if (got == 0) {
+            break;
+        }
+        if (got < 0 && errno != EINTR) {
+            return false;
+        }
+        length += got > 0 ? static_cast<size_t>(got) : 0;
+    }
+    if (length != static_cast<size_t>(status.st_size)) {
+        return false;
+    }
+    content.resize(length);
+    return true;
+}
+
 bool WriteAll(int descriptor, std::string_view content) {
     while (!content.empty()) {
         const ssize_t written = write(descriptor, content.data(), content.size());
@@ -37,8 +64,6 @@ bool WriteAll(int descriptor, std::string_view content) {
     return true;
 }
 
-}  // namespace
-
 ReadResult ReadFile(const char* path, size_t limit, FileTrust trust, std::string& content, struct stat* status) {
     const int follow = trust == FileTrust::kAny ? 0 : O_NOFOLLOW;
     const UniqueFd file(open(path, O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY | follow));
@@ -46,27 +71,12 @@ ReadResult ReadFile(const char* path, size_t limit, FileTrust trust, std::string
         return errno == ENOENT || errno == ENOTDIR ? ReadResult::kMissing : ReadResult::kRefused;
     }
     struct stat found;
-    if (fstat(file.Get(), &found) != 0 || !S_ISREG(found.st_mode) || !IsTrusted(found, trust) || found.st_size < 0 ||
-        static_cast<size_t>(found.st_size) > limit) {
+    if (fstat(file.Get(), &found) != 0 || !S_ISREG(found.st_mode) || !IsTrusted(found, trust)) {
         return ReadResult::kRefused;
     }
-    // One byte more than the file claims to have, so that one that grows meanwhile is noticed.
-    content.resize(static_cast<size_t>(found.st_size) + 1);
-    size_t length = 0;
-    while (length < content.size()) {
-        const ssize_t got = read(file.Get(), &content[length], content.size() - length);
-        if (got == 0) {
-            break;
-        }
-        if (got < 0 && errno != EINTR) {
-            return ReadResult::kRefused;
-        }
-        length += got > 0 ? static_cast<size_t>(got) : 0;
-    }
-    if (length != static_cast<size_t>(found.st_size)) {
+    if (!ReadAll(file.Get(), limit, content)) {
         return ReadResult::kRefused;
     }
-    content.resize(length);
     if (status != nullptr) {
         *status = found;
     }

@@ -33,6 +33,12 @@ enum class FileTrust {
 ReadResult ReadFile(const char* path, size_t limit, FileTrust trust, std::string& content,
                     struct stat* status = nullptr);
 
+/** Reads the rest of the file if it is at most `limit` bytes. */
+bool ReadAll(int descriptor, size_t limit, std::string& content);
+
+/** Writes all of it, in as many calls as it takes. */
+bool WriteAll(int descriptor, std::string_view content);
+
 /**
  * Makes or replaces a file with mode 0600: the content is written beside it and renamed, so that a reader sees the old
  * content or the new, never a part. Nothing is left beside it on failure.

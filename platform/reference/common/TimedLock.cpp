@@ -5,6 +5,7 @@
 
 #include <cerrno>
 #include <ctime>
+#include <utility>
 
 namespace reference {
 
@@ -20,32 +21,33 @@ bool IsPast(const struct timespec& deadline) {
 
 }  // namespace
 
-UniqueFd TakeTimedLock(const char* path, int seconds) {
-    UniqueFd file(open(path, O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY, 0600));
-    if (!file.IsOpen()) {
-        return file;
-    }
+bool LockDescriptor(int descriptor, int seconds) {
     struct timespec deadline;
     clock_gettime(CLOCK_MONOTONIC, &deadline);
     deadline.tv_sec += seconds;
     // flock has no time limit of its own. The pauses grow to a bound that keeps the wait after a release short.
     constexpr long kLongestPause = kNanosecondsPerSecond / 50;
     struct timespec pause = {0, kNanosecondsPerSecond / 2000};
-    while (flock(file.Get(), LOCK_EX | LOCK_NB) != 0) {
+    while (flock(descriptor, LOCK_EX | LOCK_NB) != 0) {
         if (errno == EINTR) {
             continue;
         }
         if (errno != EWOULDBLOCK) {
-            return UniqueFd();
+            return false;
         }
         if (IsPast(deadline)) {
             errno = ETIMEDOUT;
-            return UniqueFd();
+            return false;
         }
         nanosleep(&pause, nullptr);
         pause.tv_nsec = pause.tv_nsec * 2 < kLongestPause ? pause.tv_nsec * 2 : kLongestPause;
     }
-    return file;
+    return true;
+}
+
+UniqueFd TakeTimedLock(const char* path, int seconds) {
+    UniqueFd file(open(path, O_RDWR | O_CREAT | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY, 0600));
+    return file.IsOpen() && LockDescriptor(file.Get(), seconds) ? std::move(file) : UniqueFd();
 }
 
 }  // namespace reference

@@ -11,4 +11,7 @@ namespace reference {
  */
 UniqueFd TakeTimedLock(const char* path, int seconds);
 
+/** As `TakeTimedLock`, on a file that is open already. @return false on failure, with errno. */
+bool LockDescriptor(int descriptor, int seconds);
+
 }  // namespace reference
