@@ -16,7 +16,9 @@ Json::Value NotStarted() {
 
 }  // namespace
 
-Json::Value APIRunner::Exec(const ExecParam&) { return NotStarted(); }
+Json::Value APIRunner::Exec(const ExecParam&) {
+    return NotStarted();
+}
 
 void APIRunner::Exec(Json::Value& result, int, const char*, int, const char*, const Json::Value&, const Json::Value&,
                      const char*) {
