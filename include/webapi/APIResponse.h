@@ -101,7 +101,8 @@ public:
     // ---- headers, cookies, status ----
 
     bool HasHeader(const std::string& name) const;
-    /** Replaces the header. Names are case-sensitive here: "Content-type" is there from the start. @return false for "". */
+    /** Replaces the header. Names are case-sensitive here: "Content-type" is there from the start. @return false for
+     * "". */
     bool SetHeader(const std::string& name, const std::string& value);
     std::string GetHeader(const std::string& name, const std::string& fallback) const;
     /** All headers, name to value. */

@@ -62,7 +62,8 @@ public:
     /** A call of the reserved API "ZOVA.Entry.Request". */
     bool ProcessEntry(APIRequest* request, APIResponse* response);
     bool HandleCompound(APIRequest* request, APIResponse* response);
-    /** Runs the response's callbacks in a detached child; returns at once. Logs a hat that cannot be entered or left. */
+    /** Runs the response's callbacks in a detached child; returns at once. Logs a hat that cannot be entered or left.
+     */
     void HandleCallback(APIResponse* response);
     /** Copies the process environment into `env`, which must be an object; false with error 101 otherwise. */
     bool InitEnv(Json::Value& env);
@@ -97,7 +98,8 @@ public:
 
     // ---- libraries ----
 
-    /** Opens the library of the request's API, once, and asks for its tables. `checkTable` may be null. Logs failures. */
+    /** Opens the library of the request's API, once, and asks for its tables. `checkTable` may be null. Logs failures.
+     */
     bool OpenLib(APIRequest* request, _tag_API_TABLE** table, _tag_API_CHECK_TABLE** checkTable);
     bool CacheLib(APIRequest* request, void** handle);
     bool GetTableFunc(void* handle, _tag_API_TABLE** table);

@@ -45,6 +45,8 @@ bool DecipherEnvelope(const std::string& cipherText, Json::Value& out) {
     return ZovaCgiDecryptParam(text.data()) != 0 && WebAPIUtil::strPairToJsonObj(text.data(), out, true, true);
 }
 
-bool APIRequestPrivate::DecryptParam(Json::Value&) { return true; }
+bool APIRequestPrivate::DecryptParam(Json::Value&) {
+    return true;
+}
 
 }  // namespace ZOVA

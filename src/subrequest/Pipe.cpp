@@ -33,7 +33,9 @@ void CloseEnd(int& fd) {
 
 Pipe::Pipe() : readFd(-1), writeFd(-1) {}
 
-Pipe::~Pipe() { Close(); }
+Pipe::~Pipe() {
+    Close();
+}
 
 bool Pipe::Init() {
     int ends[2] = {-1, -1};
@@ -64,7 +66,9 @@ void Pipe::Close() {
     WriteOnly(-1);
 }
 
-bool Pipe::IsReadable() const { return readFd >= 0; }
+bool Pipe::IsReadable() const {
+    return readFd >= 0;
+}
 
 bool Pipe::WriteJson(const Json::Value& value) {
     const std::string text = Json::toString(value);

@@ -35,7 +35,7 @@ ReadResult ReadFile(const char* path, size_t limit, FileTrust trust, std::string
 
 /**
  * Makes or replaces a file with mode 0600: the content is written beside it and renamed, so that a reader sees the old
- * content or the new, never a part. Nothing is left beside it on failure.
+ * content or the new, never a part, after a loss of power too. Nothing is left beside it on failure.
  */
 bool ReplaceFile(const std::string& path, std::string_view content);
 

@@ -58,11 +58,4 @@ ReadResult ReadJson(const char* path, size_t limit, FileTrust trust, Json::Value
     return ParseJson(text, out) ? ReadResult::kGood : ReadResult::kRefused;
 }
 
-std::string JsonTextMember(const Json::Value& value, const char* name, const char* fallback) {
-    if (value.isObject() && value.isMember(name) && value[name].isString()) {
-        return value[name].asString();
-    }
-    return fallback;
-}
-
 }  // namespace reference
