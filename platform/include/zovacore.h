@@ -23,13 +23,16 @@ int QLIBCFileUnlockByFile(int fd);
 /** Idle time of a login session, in minutes. */
 int QLIBCConfGetZELMTimeout();
 /**
- * Forks a child that never writes to the client: its descriptors 0 to 2 are /dev/null.
- * @return as fork.
+ * Forks a child that never writes to the client: its descriptors 0 to 2 are /dev/null, and copies of the client's
+ * connection are closed. The child belongs to init and not to the caller, so that it leaves no zombie in a process that
+ * lives on, and the caller neither can nor must wait for it. SIGCHLD stays as the caller has it; a handler may see one
+ * signal for a short-lived child that it does not know and that is waited for here.
+ * @return as fork: in the parent the child's process id, or -1 with errno.
  */
 int QLIBCProcFork();
 /**
- * Forks a child that never holds the client's connection nor writes to it: its descriptors 0 to 2 are /dev/null, and
- * copies of the connection are closed. With the flags 65 the child is nobody's to wait for and leaves no zombie.
+ * As QLIBCProcFork with the flag 64 (the framework passes 65). Without that flag the child is the caller's own, to be
+ * waited for by the caller. Other flags change nothing.
  * @return as fork; -1 on failure.
  */
 int QLIBCProcForkEx(int flags);

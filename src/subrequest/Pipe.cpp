@@ -8,9 +8,11 @@
 #include <cstring>
 #include <memory>
 #include <string>
+#include <utility>
 
 #include "base/ErrnoGuard.h"
 #include "base/Log.h"
+#include "base/UniqueFd.h"
 #include "webapi/Json.h"
 
 namespace ZOVA {
@@ -29,6 +31,12 @@ void CloseEnd(int& fd) {
     }
 }
 
+/** The end above the standard descriptors, which are replaced in a child; none if it is refused. */
+base::UniqueFd AboveStandard(int end) {
+    base::UniqueFd owned(end);
+    return end > STDERR_FILENO ? std::move(owned) : base::UniqueFd(fcntl(end, F_DUPFD_CLOEXEC, STDERR_FILENO + 1));
+}
+
 }  // namespace
 
 Pipe::Pipe() : readFd(-1), writeFd(-1) {}
@@ -42,8 +50,13 @@ bool Pipe::Init() {
     if (pipe2(ends, O_CLOEXEC) != 0) {
         return false;
     }
-    readFd = ends[0];
-    writeFd = ends[1];
+    base::UniqueFd readEnd = AboveStandard(ends[0]);
+    base::UniqueFd writeEnd = AboveStandard(ends[1]);
+    if (!readEnd.IsOpen() || !writeEnd.IsOpen()) {
+        return false;
+    }
+    readFd = readEnd.Release();
+    writeFd = writeEnd.Release();
     return true;
 }
 

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "FakeProcess.h"
+#include "ForkedChildren.h"
 
 namespace fake {
 
@@ -94,6 +95,8 @@ public:
     /** Path prefixes under which the framework's own file calls are led elsewhere. */
     std::map<std::string, std::string> redirects;
     ForkAs forkAs = ForkAs::kParent;
+    /** How many more times a forked child that asks finds its parent, a process of root, alive. */
+    int parentPolls = 0;
     int serverRestarts = 0;
     /** Seconds since the epoch; below 0: the real clock. */
     long long clock = -1;
@@ -106,6 +109,7 @@ public:
     bool sharingDatabaseGood = true;
 
     FakeProcess process;
+    ForkedChildren children;
 
     // ---- calls ----
 

@@ -91,4 +91,9 @@ int QLIBCProcFork() {
     return platform.forkAs == fake::ForkAs::kChild ? 0 : kChildId;
 }
 
+int QLIBCProcForkEx(int flags) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    return platform.Enter(__func__, std::to_string(flags), EAGAIN) ? platform.children.Fork(platform) : -1;
+}
+
 }  // extern "C"

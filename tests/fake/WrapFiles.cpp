@@ -82,10 +82,10 @@ FAKE_EXPORT char* __wrap_getcwd(char* buffer, size_t size) {
 
 FAKE_EXPORT int __wrap_chdir(const char* path) {
     FakePlatform* platform = FakePlatform::Active();
-    if (platform != nullptr && !platform->Enter("chdir", path, EACCES)) {
-        return -1;
+    if (platform == nullptr) {
+        return __real_chdir(path);
     }
-    return __real_chdir(path);
+    return platform->Enter("chdir", path, EACCES) ? __real_chdir(platform->Redirected(path).c_str()) : -1;
 }
 
 FAKE_EXPORT int __wrap_stat(const char* path, struct stat* out) {

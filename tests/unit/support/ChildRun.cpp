@@ -73,8 +73,14 @@ void TakeLog(const Json::Value& log, ChildResult& result) {
 }
 
 [[noreturn]] void Report(int fd, const Json::Value& report) {
+    fake::FakePlatform& platform = fake::FakePlatform::Required("the child's report");
     Json::Value message(Json::objectValue);
     message["report"] = report;
+    message["forked"] = Json::Value(Json::arrayValue);
+    for (const fake::ForkedChild& child : platform.children.Take()) {
+        message["forked"].append(child.end);
+        platform.process.log.insert(platform.process.log.end(), child.log.begin(), child.log.end());
+    }
     message["log"] = LogToJson();
     const fake::Suspended suspended;
     const std::string text = Json::toString(message);
@@ -173,6 +179,9 @@ ChildResult RunInChild(const std::string& input, const std::function<Json::Value
     const bool reported = Json::fromString(message, TakeContent(reportFd));
     result.orderly = result.orderly && reported;
     result.report = Json::member(message, "report");
+    for (const Json::Value& end : Json::member(message, "forked")) {
+        result.forked.push_back(Json::asString(end));
+    }
     TakeLog(Json::member(message, "log"), result);
     return result;
 }

@@ -18,7 +18,10 @@ struct ChildResult {
     Json::Value report;
     /** Everything that it wrote to descriptor 1. */
     std::string output;
-    /** What it logged. The active fake platform has it too, so that the test's own log holds its lines. */
+    /** How the children ended that it forked itself. */
+    std::vector<std::string> forked;
+    /** What it logged, its own children's lines last. The active fake platform has it too, so that the test's own log
+     * holds its lines. */
     std::vector<fake::LogLine> log;
 };
 

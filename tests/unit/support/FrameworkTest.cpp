@@ -129,7 +129,18 @@ void FrameworkTest::ExpectAuthLog(int priority, const std::string& text) {
     ExpectLog(priority, text, "IdentityScope.cpp", LOG_AUTH);
 }
 
+std::vector<fake::ForkedChild> FrameworkTest::TakeChildren() {
+    std::vector<fake::ForkedChild> children = platform.children.Take();
+    for (const fake::ForkedChild& child : children) {
+        platform.process.log.insert(platform.process.log.end(), child.log.begin(), child.log.end());
+    }
+    return children;
+}
+
 void FrameworkTest::TearDown() {
+    for (const fake::ForkedChild& child : TakeChildren()) {
+        EXPECT_EQ(child.end, "status 0") << "a forked child";
+    }
     CheckLog(platform.process.log, expectedLines);
 }
 

@@ -78,6 +78,12 @@ protected:
     void ExpectLog(int priority, const std::string& text, const std::string& source = "", int facility = 0);
     void ExpectAuthLog(int priority, const std::string& text);
 
+    /**
+     * Waits for the children that the code under test forked; their log lines follow this process's own in the log.
+     * Those that a test does not take have to end by themselves with status 0.
+     */
+    std::vector<fake::ForkedChild> TakeChildren();
+
     EnvironmentScope environment;
     fake::FakePlatform platform;
 
