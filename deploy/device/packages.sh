@@ -3,7 +3,7 @@
 
 BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev)
 DEVICE_PACKAGES=(lighttpd busybox curl python3)
-TEST_PACKAGES=(libgtest-dev openssl)
+TEST_PACKAGES=(libgtest-dev openssl nodejs)
 CHECK_PACKAGES=(clang-format-14 clang-tidy shellcheck)
 export BUILD_PACKAGES DEVICE_PACKAGES TEST_PACKAGES CHECK_PACKAGES
 
