@@ -48,7 +48,7 @@ TEST_F(Directories, AreRefusedForLinksFilesAndOddPaths) {
     WriteFile(InRoot("/scratch/file"), "");
     ASSERT_EQ(symlink(InRoot("/home").c_str(), InRoot("/scratch/link").c_str()), 0);
     for (const std::string& path :
-         {InRoot("/scratch/file"), InRoot("/scratch/file/x"), InRoot("/scratch/link"), InRoot("/scratch/../work/x"),
+         {InRoot("/scratch/file"), InRoot("/scratch/file/x"), InRoot("/scratch/link"), InRoot("/scratch/../other/x"),
           InRoot("/scratch/.."), std::string("work/x"), std::string("/"), std::string(), std::string("//")}) {
         EXPECT_LT(ZOVAFSMkdirP(path.c_str(), 0, 0, -1, -1, 0755), 0) << path;
     }
