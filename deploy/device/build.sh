@@ -25,3 +25,7 @@ build_device() {
 build_with_tests() {
     _build_preset "$1" all -DWEBAPI_TESTS=ON
 }
+
+build_fuzz_targets() {
+    _build_preset fuzz fuzz_targets -DWEBAPI_TESTS=ON
+}

@@ -17,8 +17,10 @@ URL = os.environ["WEBAPI_URL"]
 PASSWORD = os.environ["WEBAPI_PASSWORD"]
 
 WATCHED = ("/etc", "/home", "/root", "/run", "/tmp", "/usr/lib/zova", "/usr/zova", "/var")
+# The project may lie under a watched folder, and with it the layer that the device itself is kept in.
+PROJECT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.dirname(os.path.abspath(__file__)))))
 # Logs, and the counts of login attempts, are written whatever the call.
-PASSED_OVER = (LOGS, FAILURES)
+PASSED_OVER = (LOGS, FAILURES, PROJECT)
 
 
 def watched_files():
