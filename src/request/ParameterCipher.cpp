@@ -17,7 +17,7 @@ constexpr int kKeyTextSize = 33;
 
 /** Takes a member out as text. */
 std::string TakeText(Json::Value& object, const char* name) {
-    const std::string text = Json::asString(object[name]);
+    std::string text = Json::asString(object[name]);
     object.removeMember(name);
     return text;
 }

@@ -123,9 +123,9 @@ TEST_F(Cipher, OpensWhatTheDocumentedSampleMakes) {
     const size_t first = page.find(start);
     ASSERT_NE(first, std::string::npos);
     const std::string sample = page.substr(first + start.size(), page.find("```", first + 3) - first - start.size());
-    WriteFile(InRoot("/work/sample.mjs"),
+    WriteFile(InRoot("/scratch/sample.mjs"),
               sample + "\nprocess.stdout.write(await encipher(process.argv[2], process.argv[3]));\n");
-    const std::string command = "node " + InRoot("/work/sample.mjs") + " '" + PublicKey() + "' '" + kLine + "'";
+    const std::string command = "node " + InRoot("/scratch/sample.mjs") + " '" + PublicKey() + "' '" + kLine + "'";
     std::string plain;
     EXPECT_TRUE(Deciphers(OutputOf(command), &plain));
     EXPECT_EQ(plain, kLine);

@@ -25,23 +25,23 @@ double Now() {
 }  // namespace
 
 TEST_F(Files, TellsWhatExists) {
-    WriteFile(InRoot("/work/file"), "");
-    EXPECT_EQ(QLIBCFileExist(InRoot("/work/file").c_str()), 1);
-    EXPECT_EQ(QLIBCFileExist(InRoot("/work").c_str()), 1);
-    EXPECT_NE(QLIBCFileExist(InRoot("/work/none").c_str()), 1);
+    WriteFile(InRoot("/scratch/file"), "");
+    EXPECT_EQ(QLIBCFileExist(InRoot("/scratch/file").c_str()), 1);
+    EXPECT_EQ(QLIBCFileExist(InRoot("/scratch").c_str()), 1);
+    EXPECT_NE(QLIBCFileExist(InRoot("/scratch/none").c_str()), 1);
     EXPECT_NE(QLIBCFileExist(""), 1);
     EXPECT_NE(QLIBCFileExist(nullptr), 1);
 }
 
 TEST_F(Files, ComparesAPairOfAnInformationFile) {
-    const std::string path = InRoot("/work/info.conf");
+    const std::string path = InRoot("/scratch/info.conf");
     WriteFile(path, "# comment\nenable_data_collect=\"yes\"\nempty=\"\"\n");
     EXPECT_NE(QLIBCFileCheckKeyValue(path.c_str(), "enable_data_collect", "yes", 0), 0);
     EXPECT_EQ(QLIBCFileCheckKeyValue(path.c_str(), "enable_data_collect", "ye", 0), 0);
     EXPECT_EQ(QLIBCFileCheckKeyValue(path.c_str(), "enable_data", "yes", 0), 0);
     EXPECT_NE(QLIBCFileCheckKeyValue(path.c_str(), "empty", "", 0), 0);
     EXPECT_EQ(QLIBCFileCheckKeyValue(path.c_str(), "absent", "", 0), 0);
-    EXPECT_EQ(QLIBCFileCheckKeyValue(InRoot("/work/none").c_str(), "a", "b", 0), 0);
+    EXPECT_EQ(QLIBCFileCheckKeyValue(InRoot("/scratch/none").c_str(), "a", "b", 0), 0);
     EXPECT_EQ(QLIBCFileCheckKeyValue(nullptr, "a", "b", 0), 0);
     EXPECT_EQ(QLIBCFileCheckKeyValue(path.c_str(), nullptr, "b", 0), 0);
     EXPECT_EQ(QLIBCFileCheckKeyValue(path.c_str(), "a", nullptr, 0), 0);
@@ -50,7 +50,7 @@ TEST_F(Files, ComparesAPairOfAnInformationFile) {
 }
 
 TEST_F(Files, TouchMakesAPrivateFileAndRenewsIt) {
-    const std::string path = InRoot("/work/stamp");
+    const std::string path = InRoot("/scratch/stamp");
     ASSERT_EQ(QLIBCFileTouch(path.c_str()), 0);
     EXPECT_EQ(ModeOf(path), 0600u);
     MakeOlder(path, 5000);
@@ -58,15 +58,15 @@ TEST_F(Files, TouchMakesAPrivateFileAndRenewsIt) {
     struct stat status;
     ASSERT_EQ(stat(path.c_str(), &status), 0);
     EXPECT_GT(status.st_mtime, time(nullptr) - 1000);
-    ASSERT_EQ(symlink("target", InRoot("/work/link").c_str()), 0);
-    EXPECT_LT(QLIBCFileTouch(InRoot("/work/link").c_str()), 0);
-    EXPECT_FALSE(Exists(InRoot("/work/target")));
-    EXPECT_LT(QLIBCFileTouch(InRoot("/work/no/folder").c_str()), 0);
+    ASSERT_EQ(symlink("target", InRoot("/scratch/link").c_str()), 0);
+    EXPECT_LT(QLIBCFileTouch(InRoot("/scratch/link").c_str()), 0);
+    EXPECT_FALSE(Exists(InRoot("/scratch/target")));
+    EXPECT_LT(QLIBCFileTouch(InRoot("/scratch/no/folder").c_str()), 0);
     EXPECT_LT(QLIBCFileTouch(nullptr), 0);
 }
 
 TEST_F(Files, UTimeSetsNowOrTheGivenTime) {
-    const std::string path = InRoot("/work/file");
+    const std::string path = InRoot("/scratch/file");
     WriteFile(path, "");
     MakeOlder(path, 5000);
     ASSERT_EQ(QLIBCFileUTime(path.c_str(), 1, 0), 0);
@@ -76,12 +76,12 @@ TEST_F(Files, UTimeSetsNowOrTheGivenTime) {
     ASSERT_EQ(QLIBCFileUTime(path.c_str(), 0, 12345), 0);
     ASSERT_EQ(stat(path.c_str(), &status), 0);
     EXPECT_EQ(status.st_mtime, 12345);
-    EXPECT_LT(QLIBCFileUTime(InRoot("/work/none").c_str(), 1, 0), 0);
+    EXPECT_LT(QLIBCFileUTime(InRoot("/scratch/none").c_str(), 1, 0), 0);
     EXPECT_LT(QLIBCFileUTime(nullptr, 1, 0), 0);
 }
 
 TEST_F(Locks, GiveUpWhenTheTimeIsUp) {
-    const std::string path = InRoot("/work/lock");
+    const std::string path = InRoot("/scratch/lock");
     int first = -1;
     ASSERT_GE(QLIBCFileLockTimeByFile(path.c_str(), 1, 2, &first), 0);
     EXPECT_EQ(ModeOf(path), 0600u);
@@ -99,7 +99,7 @@ TEST_F(Locks, GiveUpWhenTheTimeIsUp) {
 }
 
 TEST_F(Locks, AreTakenAsSoonAsTheyAreFree) {
-    const std::string path = InRoot("/work/lock");
+    const std::string path = InRoot("/scratch/lock");
     int fd = -1;
     ASSERT_GE(QLIBCFileLockTimeByFile(path.c_str(), 1, 0, &fd), 0);
     int ready[2];
@@ -124,12 +124,12 @@ TEST_F(Locks, AreTakenAsSoonAsTheyAreFree) {
 
 TEST_F(Locks, RefuseBadArgumentsAndLinks) {
     int fd = -7;
-    const std::string path = InRoot("/work/lock");
+    const std::string path = InRoot("/scratch/lock");
     EXPECT_LT(QLIBCFileLockTimeByFile(nullptr, 1, 1, &fd), 0);
     EXPECT_LT(QLIBCFileLockTimeByFile(path.c_str(), 2, 1, &fd), 0);
     EXPECT_LT(QLIBCFileLockTimeByFile(path.c_str(), 1, -1, &fd), 0);
     EXPECT_LT(QLIBCFileLockTimeByFile(path.c_str(), 1, 1, nullptr), 0);
-    EXPECT_LT(QLIBCFileLockTimeByFile(InRoot("/work/no/folder").c_str(), 1, 1, &fd), 0);
+    EXPECT_LT(QLIBCFileLockTimeByFile(InRoot("/scratch/no/folder").c_str(), 1, 1, &fd), 0);
     ASSERT_EQ(symlink("target", path.c_str()), 0);
     EXPECT_LT(QLIBCFileLockTimeByFile(path.c_str(), 1, 1, &fd), 0);
     EXPECT_EQ(fd, -7);

@@ -93,7 +93,7 @@ TEST(AccessToken, IsAlwaysRefusedAndLeavesTheNameAlone) {
 }
 
 TEST_F(WebServer, RunsTheCommandWithItsArgumentsAndNoShell) {
-    const std::string target = InRoot("/work/$(touch x);made");
+    const std::string target = InRoot("/scratch/$(touch x);made");
     EXPECT_TRUE(Restart("{\"restart\":[\"/usr/bin/touch\",\"" + target + "\"]}"));
     EXPECT_TRUE(Exists(target));
 }

@@ -153,7 +153,7 @@ ScopedVariable::~ScopedVariable() {
 }
 
 void DeviceTest::SetUp() {
-    for (const char* folder : {"/etc", "/run", "/var", "/home", "/work"}) {
+    for (const char* folder : {"/etc", "/run", "/var", "/home", "/scratch"}) {
         RemoveContent(InRoot(folder));
         MakeDirectory(InRoot(folder), 0755);
     }

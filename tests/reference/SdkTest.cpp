@@ -22,39 +22,39 @@ struct stat StatusOf(const std::string& path) {
 
 TEST_F(Directories, AreMadeWithParentsAndExactlyTheModeWhateverTheUmask) {
     const mode_t old = umask(0077);
-    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/work/a/b/c").c_str(), 0, 0, -1, -1, 0771), 0);
+    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/scratch/a/b/c").c_str(), 0, 0, -1, -1, 0771), 0);
     umask(old);
-    EXPECT_EQ(ModeOf(InRoot("/work/a")), 0755u);
-    EXPECT_EQ(ModeOf(InRoot("/work/a/b/c")), 0771u);
-    EXPECT_EQ(StatusOf(InRoot("/work/a/b/c")).st_uid, 0u);
+    EXPECT_EQ(ModeOf(InRoot("/scratch/a")), 0755u);
+    EXPECT_EQ(ModeOf(InRoot("/scratch/a/b/c")), 0771u);
+    EXPECT_EQ(StatusOf(InRoot("/scratch/a/b/c")).st_uid, 0u);
 }
 
 TEST_F(Directories, GetTheOwnerAskedFor) {
-    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/work/d/").c_str(), 0, 1, kAliceUid, kAliceGid, 0600), 0);
-    EXPECT_EQ(StatusOf(InRoot("/work/d")).st_uid, kAliceUid);
-    EXPECT_EQ(StatusOf(InRoot("/work/d")).st_gid, kAliceGid);
-    EXPECT_EQ(ModeOf(InRoot("/work/d")), 0600u);
+    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/scratch/d/").c_str(), 0, 1, kAliceUid, kAliceGid, 0600), 0);
+    EXPECT_EQ(StatusOf(InRoot("/scratch/d")).st_uid, kAliceUid);
+    EXPECT_EQ(StatusOf(InRoot("/scratch/d")).st_gid, kAliceGid);
+    EXPECT_EQ(ModeOf(InRoot("/scratch/d")), 0600u);
 }
 
 TEST_F(Directories, ThatExistKeepTheirModeOnlyWhenAsked) {
-    ASSERT_EQ(ZOVAFSMkdirP(InRoot("/work/d").c_str(), 0, 0, -1, -1, 0700), 0);
-    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/work/d").c_str(), 0, 1, -1, -1, 0777), 0);
-    EXPECT_EQ(ModeOf(InRoot("/work/d")), 0700u);
-    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/work/d").c_str(), 0, 0, -1, -1, 0750), 0);
-    EXPECT_EQ(ModeOf(InRoot("/work/d")), 0750u);
+    ASSERT_EQ(ZOVAFSMkdirP(InRoot("/scratch/d").c_str(), 0, 0, -1, -1, 0700), 0);
+    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/scratch/d").c_str(), 0, 1, -1, -1, 0777), 0);
+    EXPECT_EQ(ModeOf(InRoot("/scratch/d")), 0700u);
+    EXPECT_EQ(ZOVAFSMkdirP(InRoot("/scratch/d").c_str(), 0, 0, -1, -1, 0750), 0);
+    EXPECT_EQ(ModeOf(InRoot("/scratch/d")), 0750u);
 }
 
 TEST_F(Directories, AreRefusedForLinksFilesAndOddPaths) {
-    WriteFile(InRoot("/work/file"), "");
-    ASSERT_EQ(symlink(InRoot("/home").c_str(), InRoot("/work/link").c_str()), 0);
+    WriteFile(InRoot("/scratch/file"), "");
+    ASSERT_EQ(symlink(InRoot("/home").c_str(), InRoot("/scratch/link").c_str()), 0);
     for (const std::string& path :
-         {InRoot("/work/file"), InRoot("/work/file/x"), InRoot("/work/link"), InRoot("/work/../work/x"),
-          InRoot("/work/.."), std::string("work/x"), std::string("/"), std::string(), std::string("//")}) {
+         {InRoot("/scratch/file"), InRoot("/scratch/file/x"), InRoot("/scratch/link"), InRoot("/scratch/../other/x"),
+          InRoot("/scratch/.."), std::string("work/x"), std::string("/"), std::string(), std::string("//")}) {
         EXPECT_LT(ZOVAFSMkdirP(path.c_str(), 0, 0, -1, -1, 0755), 0) << path;
     }
     EXPECT_LT(ZOVAFSMkdirP(nullptr, 0, 0, -1, -1, 0755), 0);
-    EXPECT_LT(ZOVAFSMkdirP(InRoot("/work/x").c_str(), 0, 0, -1, -1, 0200000), 0);
-    EXPECT_FALSE(Exists(InRoot("/work/x")));
+    EXPECT_LT(ZOVAFSMkdirP(InRoot("/scratch/x").c_str(), 0, 0, -1, -1, 0200000), 0);
+    EXPECT_FALSE(Exists(InRoot("/scratch/x")));
 }
 
 TEST(Users, TellsIdsAndKnowsSystemAsRoot) {
@@ -99,8 +99,8 @@ TEST_F(PreferenceDirectories, OfAUserLiesInTheHomeAndIsTheUsers) {
     EXPECT_EQ(ModeOf(buffer), 0700u);
     EXPECT_GE(ZOVAUserPreferenceDirGet("alice", buffer, sizeof(buffer)), 0);
     EXPECT_EQ(geteuid(), 0u);
-    WriteFile(InRoot("/work/roots"), "");
-    EXPECT_EQ(StatusOf(InRoot("/work/roots")).st_uid, 0u);
+    WriteFile(InRoot("/scratch/roots"), "");
+    EXPECT_EQ(StatusOf(InRoot("/scratch/roots")).st_uid, 0u);
 }
 
 TEST_F(PreferenceDirectories, OfAUserIsRefusedWhereItCannotBeTheUsers) {
@@ -111,7 +111,7 @@ TEST_F(PreferenceDirectories, OfAUserIsRefusedWhereItCannotBeTheUsers) {
     EXPECT_LT(ZOVAUserPreferenceDirGet(nullptr, buffer, sizeof(buffer)), 0);
     EXPECT_LT(ZOVAUserPreferenceDirGet("alice", buffer, 5), 0);
     EXPECT_LT(ZOVAUserPreferenceDirGet("alice", nullptr, 5), 0);
-    ASSERT_EQ(symlink(InRoot("/work").c_str(), InRoot("/home/boss/.zova").c_str()), 0);
+    ASSERT_EQ(symlink(InRoot("/scratch").c_str(), InRoot("/home/boss/.zova").c_str()), 0);
     EXPECT_LT(ZOVAUserPreferenceDirGet("boss", buffer, sizeof(buffer)), 0);
     ASSERT_EQ(mkdir(InRoot("/home/primaryboss/.zova").c_str(), 0700), 0);
     EXPECT_LT(ZOVAUserPreferenceDirGet("primaryboss", buffer, sizeof(buffer)), 0);

@@ -72,23 +72,23 @@ TEST(UrlCoding, DecodingReversesEncodingOfEveryByte) {
 
 TEST_F(ReadJsonFile, ReadsAWholeValue) {
     Json::Value out;
-    WriteFile(InRoot("/work/a.lib"), "{\"a\":[1,2]}\n");
-    ASSERT_TRUE(WebAPIUtil::ReadJsonFile(out, InRoot("/work/a.lib").c_str()));
+    WriteFile(InRoot("/scratch/a.lib"), "{\"a\":[1,2]}\n");
+    ASSERT_TRUE(WebAPIUtil::ReadJsonFile(out, InRoot("/scratch/a.lib").c_str()));
     EXPECT_EQ(reference::WriteJson(out), R"({"a":[1,2]})");
 }
 
 TEST_F(ReadJsonFile, LeavesTheTargetAloneForWhatItCannotRead) {
-    WriteFile(InRoot("/work/comment"), "{} // x");
-    WriteFile(InRoot("/work/comma"), "[1,]");
-    WriteFile(InRoot("/work/more"), "{} {}");
-    WriteFile(InRoot("/work/empty"), "");
-    WriteFile(InRoot("/work/deep"), std::string(257, '[') + std::string(257, ']'));
-    WriteFile(InRoot("/work/abyss"), std::string(100000, '['));
-    WriteFile(InRoot("/work/nul"), std::string("{}\0", 3));
-    ASSERT_EQ(mkfifo(InRoot("/work/pipe").c_str(), 0600), 0);
+    WriteFile(InRoot("/scratch/comment"), "{} // x");
+    WriteFile(InRoot("/scratch/comma"), "[1,]");
+    WriteFile(InRoot("/scratch/more"), "{} {}");
+    WriteFile(InRoot("/scratch/empty"), "");
+    WriteFile(InRoot("/scratch/deep"), std::string(257, '[') + std::string(257, ']'));
+    WriteFile(InRoot("/scratch/abyss"), std::string(100000, '['));
+    WriteFile(InRoot("/scratch/nul"), std::string("{}\0", 3));
+    ASSERT_EQ(mkfifo(InRoot("/scratch/pipe").c_str(), 0600), 0);
     for (const char* name : {"comment", "comma", "more", "empty", "deep", "abyss", "nul", "pipe", "missing", ""}) {
         Json::Value out("before");
-        EXPECT_FALSE(WebAPIUtil::ReadJsonFile(out, InRoot(std::string("/work/") + name).c_str())) << name;
+        EXPECT_FALSE(WebAPIUtil::ReadJsonFile(out, InRoot(std::string("/scratch/") + name).c_str())) << name;
         EXPECT_EQ(out.asString(), "before") << name;
     }
     Json::Value out("before");
