@@ -96,7 +96,9 @@ extern template class APIParameter<unsigned long long>;
 extern template class APIParameter<bool>;
 extern template class APIParameter<double>;
 extern template class APIParameter<std::string>;
-extern template class APIParameter<Json::Value>;
+// Said once more: the JSON library leaves its types to the visibility of whoever includes it, and an instance is no
+// more visible than its argument.
+extern template class WEBAPI_EXPORT APIParameter<Json::Value>;
 
 /**
  * Parameters from a JSON object that did not come from a request. Where `json` is no object the parameter is invalid,
