@@ -37,7 +37,9 @@ public:
     /** Called with a value of the right type; false makes the parameter invalid. Null: no further test. */
     using Validator = bool (*)(const T&);
 
+    /** Start value, no flag set. */
     APIParameter();
+    /** Copies carry value and flags. */
     APIParameter(const APIParameter& other);
     APIParameter& operator=(const APIParameter& other);
     ~APIParameter();
@@ -47,11 +49,16 @@ public:
     /** The value if set and not invalid, otherwise `fallback`. A reset parameter gives its start value. */
     const T& Get(const T& fallback) const;
 
+    /** The name was there, or a default was taken. */
     bool IsSet() const;
+    /** The client sent null: it asks to clear. */
     bool IsReset() const;
+    /** Required and missing, of the wrong type, out of range, or refused by the validator. */
     bool IsInvalid() const;
+    /** The value came from `SetDefault`. */
     bool IsDefault() const;
 
+    /** Each sets its one flag and no other. */
     void MarkSet();
     void MarkReset();
     void MarkInvalid();
@@ -89,7 +96,9 @@ extern template class APIParameter<unsigned long long>;
 extern template class APIParameter<bool>;
 extern template class APIParameter<double>;
 extern template class APIParameter<std::string>;
-extern template class APIParameter<Json::Value>;
+// Said once more: the JSON library leaves its types to the visibility of whoever includes it, and an instance is no
+// more visible than its argument.
+extern template class WEBAPI_EXPORT APIParameter<Json::Value>;
 
 /**
  * Parameters from a JSON object that did not come from a request. Where `json` is no object the parameter is invalid,
@@ -98,6 +107,7 @@ extern template class APIParameter<Json::Value>;
 template <class T>
 class WEBAPI_EXPORT APIParameterFactoryBasicImpl {
 public:
+    /** The member `key` of `json` as the class says; `validator` may be null. */
     static APIParameter<T> FromJson(const Json::Value& json, const std::string& key, PARAM_NECESSITY necessity,
                                     typename APIParameter<T>::Validator validator = nullptr);
 };
@@ -113,9 +123,11 @@ extern template class APIParameterFactoryBasicImpl<std::string>;
 /** As `APIParameterFactoryBasicImpl`, for arrays and objects. */
 class WEBAPI_EXPORT APIParameterFactory {
 public:
+    /** The member `key` if it is an array. */
     static APIParameter<Json::Value> ArrayFromJson(const Json::Value& json, const std::string& key,
                                                    PARAM_NECESSITY necessity,
                                                    APIParameter<Json::Value>::Validator validator = nullptr);
+    /** The member `key` if it is an object. */
     static APIParameter<Json::Value> ObjectFromJson(const Json::Value& json, const std::string& key,
                                                     PARAM_NECESSITY necessity,
                                                     APIParameter<Json::Value>::Validator validator = nullptr);

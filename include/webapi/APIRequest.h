@@ -97,41 +97,53 @@ public:
 
     // ---- environment, parameters, cookies, attributes ----
 
+    /** Whether the variable is there, even if empty. */
     bool HasEnv(const std::string& key) const;
     /** A CGI variable; all of them as an object for "". Names that begin with HTTP_ hold client input. */
     Json::Value GetEnv(const std::string& key, const Json::Value& fallback) const;
 
+    /** Whether the parameter is there, even if null. */
     bool HasParam(const std::string& key) const;
     /** A parameter as the client sent it, of any JSON type; all of them for "". */
     Json::Value GetParam(const std::string& key, const Json::Value& fallback) const;
     /** As `GetParam`, without a copy: valid until the request changes, and as long as `fallback` lives. */
     const Json::Value& GetParamRef(const std::string& key, const Json::Value& fallback) const;
 
+    /** Whether the client sent the cookie, even if empty. */
     bool HasCookie(const std::string& key) const;
     /** A cookie's value, percent-decoded; `fallback` if there is none or it is no text. */
     std::string GetCookie(const std::string& key, const std::string& fallback) const;
     /** @return false for an empty key. The client does not see it: that is `APIResponse::AddCookie`. */
     bool SetCookie(const std::string& key, const std::string& value);
 
+    /** Attributes are free values that whoever runs a call hands on with it; no client can set one. */
     bool HasAttr(const std::string& key) const;
+    /** An attribute, or all of them for "". */
     Json::Value GetAttr(const std::string& key, const Json::Value& fallback) const;
+    /** Stores a copy; an empty key is ignored. */
     void SetAttr(const std::string& key, const Json::Value& value);
 
     // ---- typed parameters: see APIParameter for what comes back ----
 
+    /** An integer of 32 bits. */
     APIParameter<int> GetAndCheckInt(const std::string& key, PARAM_NECESSITY necessity,
                                      APIParameter<int>::Validator validator = nullptr) const;
+    /** true or false; no number. */
     APIParameter<bool> GetAndCheckBool(const std::string& key, PARAM_NECESSITY necessity,
                                        APIParameter<bool>::Validator validator = nullptr) const;
+    /** Any number. */
     APIParameter<double> GetAndCheckReal(const std::string& key, PARAM_NECESSITY necessity,
                                          APIParameter<double>::Validator validator = nullptr) const;
+    /** A text, of any bytes. */
     APIParameter<std::string> GetAndCheckString(const std::string& key, PARAM_NECESSITY necessity,
                                                 APIParameter<std::string>::Validator validator = nullptr) const;
+    /** An array; its elements are not looked at. */
     APIParameter<Json::Value> GetAndCheckArray(const std::string& key, PARAM_NECESSITY necessity,
                                                APIParameter<Json::Value>::Validator validator = nullptr) const;
+    /** An object; its members are not looked at. */
     APIParameter<Json::Value> GetAndCheckObject(const std::string& key, PARAM_NECESSITY necessity,
                                                 APIParameter<Json::Value>::Validator validator = nullptr) const;
-    /** T is `long long`, `unsigned int` or `unsigned long long`. */
+    /** An integer of T's range; T is `long long`, `unsigned int` or `unsigned long long`. */
     template <class T>
     APIParameter<T> GetAndCheckIntegral(const std::string& key, PARAM_NECESSITY necessity,
                                         typename APIParameter<T>::Validator validator = nullptr) const;
@@ -156,11 +168,13 @@ public:
 
     /** Login name; "" if nobody is logged in. */
     std::string GetLoginUserName() const;
+    /** For those who authorise: names the caller. */
     void SetLoginUserName(const std::string& name);
     /** Whether the caller is a member of the administrators' group. */
     bool IsAdmin() const;
     /** User id of the login session, asked of the system once; 4294967295 if nobody is logged in. */
     unsigned int GetLoginUID();
+    /** Whether the request passed authorisation. */
     bool IsAuthorized() const;
     /** Whether the session has timed out; true without a session. */
     bool IsTimeout() const;
@@ -192,8 +206,9 @@ public:
     std::string GetPreferenceDir() const;
     /** Preference directory of a group; "/tmp" if the system knows none. */
     std::string GetGroupPreferenceDir(const std::string& group) const;
+    /** For those who authorise: keeps the outcome in the session. */
     void SetAuthResult(_tag_authorized_result_ result);
-    /** -4 before authorisation. */
+    /** The outcome; -4 before authorisation. */
     _tag_authorized_result_ GetAuthResult() const;
     /** Client address as the CGI library worked it out, or "". */
     std::string GetRemoteIP() const;
@@ -206,7 +221,9 @@ public:
 
     // ---- kind of request ----
 
+    /** Whether the body is a multipart form, or a slice of an upload. */
     bool IsUploadRequest() const;
+    /** Whether the body is one slice of an upload. */
     bool IsSliceUploadRequest() const;
     /** Whether this process is a background task's. */
     bool IsPollingTask() const;
@@ -217,8 +234,11 @@ public:
 
     /** Whether the request came through a sharing link; the link need not be a good one. */
     bool IsSharing() const;
+    /** Hash of the sharing link, or "". */
     std::string GetSharingID() const;
+    /** Session id of the link's visitor, or "". A secret: not for logs. */
     std::string GetSharingSID() const;
+    /** Records of link, session and token as the sharing database gave them; of an unknown one an empty record. */
     sharing::record::Entry GetSharingEntry() const;
     sharing::record::Session GetSharingSession() const;
     sharing::record::Token GetSharingToken() const;

@@ -100,9 +100,12 @@ public:
 
     // ---- headers, cookies, status ----
 
+    /** Whether the header is there, in this spelling. */
     bool HasHeader(const std::string& name) const;
-    /** Replaces the header. Names are case-sensitive here: "Content-type" is there from the start. @return false for "". */
+    /** Replaces the header. Names are case-sensitive here: "Content-type" is there from the start. @return false for
+     * "". */
     bool SetHeader(const std::string& name, const std::string& value);
+    /** The header's value, or `fallback` if it is not there. */
     std::string GetHeader(const std::string& name, const std::string& fallback) const;
     /** All headers, name to value. */
     Json::Value GetHeaders() const;
@@ -136,11 +139,13 @@ public:
     bool IsEnableOutput() const;
     /** False says that the output has been written already, by a download for instance. */
     void SetEnableOutput(bool enable);
+    /** Whether the web server is to restart; false unless asked for. */
     bool GetHttpdRestart() const;
     /** True makes the web server restart once the answer is out. */
     void SetHttpdRestart(bool restart);
     /** The word of the header "x-request-error", or "". */
     std::string GetServerError() const;
+    /** Sets the header: a short word that tells a client's error handler the kind of a refusal. */
     void SetServerError(const std::string& word);
     /** Whether the header exists, even if empty. */
     bool HasServerError() const;

@@ -46,11 +46,15 @@ public:
     virtual bool CanProcessSocket(APIRequest* request);
     /** Fills the top-level request; false with the error in the response. */
     virtual bool Initialize(const Json::Value& description);
+    /** The gate of a call through a sharing link. True here; an override that refuses sets the error. */
     virtual bool CheckSharingPermission(APIRequest* request, APIResponse* response);
+    /** Whether the call has to pass `CheckPermission`. False here. */
     virtual bool NeedPermission(APIRequest* request);
+    /** The gate of any other call. True here; an override that refuses sets the error. */
     virtual bool CheckPermission(APIRequest* request, APIResponse* response);
+    /** Takes an upload before the method runs. True here; an override that fails sets the error. */
     virtual bool HandleUpload(APIRequest* request, APIResponse* response);
-    /** Whether a refused call goes on all the same. */
+    /** Whether a refused call goes on all the same, its error standing until the method answers. True here. */
     virtual bool SkipPermission(APIRequest* request);
 
     // ---- the frame ----
@@ -59,10 +63,12 @@ public:
     Json::Value GetResponse() const;
     /** One call, from admission to the method. */
     bool Process(APIRequest* request, APIResponse* response);
-    /** A call of the reserved API "ZOVA.Entry.Request". */
+    /** A call of the reserved API "ZOVA.Entry.Request": 110 without "compound"; false for any method but "request". */
     bool ProcessEntry(APIRequest* request, APIResponse* response);
+    /** Runs the batch that the request's parameter "compound" holds. */
     bool HandleCompound(APIRequest* request, APIResponse* response);
-    /** Runs the response's callbacks in a detached child; returns at once. Logs a hat that cannot be entered or left. */
+    /** Runs the response's callbacks in a detached child; returns at once. Logs a hat that cannot be entered or left.
+     */
     void HandleCallback(APIResponse* response);
     /** Copies the process environment into `env`, which must be an object; false with error 101 otherwise. */
     bool InitEnv(Json::Value& env);
@@ -88,21 +94,27 @@ public:
     bool InitLibDesc(Json::Value& out);
     /** Loads the file that describes `api`, unless `out` has it. True does not say that the file described it. Logs. */
     bool InitLibDesc(Json::Value& out, const std::string& api);
+    /** As above for the request's API; false for a null request. */
     bool InitLibDesc(Json::Value& out, APIRequest* request);
     /** The method's attributes; those of `lib.def` for a method without any. Valid until the next description loads. */
     const Json::Value& GetMethod(const std::string& api, int version, const std::string& method);
     /** One attribute of the method as a bool; absent is false. */
     bool GetMethodAttr(const std::string& api, int version, const std::string& method, const std::string& attr);
+    /** The same for the request's call; false for a null request and for an empty name. */
     bool GetMethodAttr(APIRequest* request, const std::string& attr);
 
     // ---- libraries ----
 
-    /** Opens the library of the request's API, once, and asks for its tables. `checkTable` may be null. Logs failures. */
+    /** Opens the library of the request's API, once, and asks for its tables. `checkTable` may be null. Logs failures.
+     */
     bool OpenLib(APIRequest* request, _tag_API_TABLE** table, _tag_API_CHECK_TABLE** checkTable);
+    /** The handle of the library, owned by the runner and opened once per path; a failure is logged and not kept. */
     bool CacheLib(APIRequest* request, void** handle);
+    /** The method table of an open library; false, with a line in the log, if it gives none. */
     bool GetTableFunc(void* handle, _tag_API_TABLE** table);
-    /** True also for a library without a check table, which leaves `table` alone. */
+    /** The check table. True also for a library without one, which leaves `table` alone; a null table is logged. */
     bool GetCheckTableFunc(void* handle, _tag_API_CHECK_TABLE** table);
+    /** Closes all libraries; tables and methods of theirs are gone then. */
     void CloseLib();
 
     // ---- running ----
@@ -116,11 +128,18 @@ public:
 
     // ---- running a call out of band, as a named user ----
 
+    /** @return the body of the answer, with "httpd_restart". Needs no runner of the caller's own. */
     static Json::Value Exec(const ExecParam& param);
+    /**
+     * The same from single values. `fd` of 0 or above gets the method's standard output; it stays the caller's.
+     * `params` and `attr` may be null, the three texts may not be empty.
+     */
     static void Exec(Json::Value& result, int fd, const char* api, int version, const char* method,
                      const Json::Value& params, const Json::Value& attr, const char* runner);
+    /** Without standard output. */
     static void Exec(Json::Value& result, const char* api, int version, const char* method, const Json::Value& params,
                      const Json::Value& attr, const char* runner);
+    /** Without standard output and attributes. */
     static void Exec(Json::Value& result, const char* api, int version, const char* method, const Json::Value& params,
                      const char* runner);
 

@@ -56,9 +56,8 @@ public:
     void Output(_tag_WEBAPI_ERR code);
 
 private:
-    [[noreturn]] void RunChild(Pipe& pipe, int parent);
-    int RunInChild(unsigned int index, bool& finished);
-    bool AllowsTransfer() const;
+    [[noreturn]] WEBAPI_LOCAL void RunChild(Pipe& pipe, int parent);
+    WEBAPI_LOCAL int RunInChild(unsigned int index, bool& finished);
 
     APIRequest* request;
     APIResponse* response;

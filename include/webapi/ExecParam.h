@@ -79,8 +79,6 @@ public:
     void RunForkForStdout();
 
 private:
-    void Fail(int code);
-
     const ExecParam* param;
     APIRunner runner;
     Json::Value runDescription;

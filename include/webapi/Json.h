@@ -20,8 +20,9 @@ namespace Json {
 constexpr int kMaximumDepth = 256;
 
 /**
- * Parses one JSON value and nothing behind it. Comments, trailing commas and other extensions are refused. Of two
- * members of one name the later counts. Invalid UTF-8 is kept as it stands.
+ * Parses one JSON value and nothing behind it. Comments and trailing commas are refused; what else the stock reader
+ * lets pass beyond JSON proper (a number such as 01, a control byte in a text) passes here too. Of two members of one
+ * name the later counts. Invalid UTF-8 is kept as it stands.
  * @return false for text that is no JSON or is nested deeper than kMaximumDepth; `value` is then left alone.
  */
 WEBAPI_EXPORT bool fromString(Value& value, const std::string& text);

@@ -31,6 +31,7 @@ public:
 
     /** Serves the call; the argument is not looked at. */
     void Run(const Json::Value& description) override;
+    /** Fills the request from environment, query string and body; false with the error in the response. */
     bool Initialize(const Json::Value& description) override;
 
     /** Login, device token or bearer token, kind of user, application privilege. Logs a failed token. */
@@ -40,11 +41,13 @@ public:
      * @return 0 or the error number.
      */
     int CheckPermission(bool allowTimeout);
+    /** The gate of sharing links. */
     bool CheckSharingPermission(APIRequest* request, APIResponse* response) override;
     /** False only for "authLevel" 0. */
     bool NeedPermission(APIRequest* request) override;
     /** True only for "authLevel" 2. */
     bool SkipPermission(APIRequest* request) override;
+    /** Stores an upload's files for the method; 108 in the response if that fails. */
     bool HandleUpload(APIRequest* request, APIResponse* response) override;
 
     /** Writes the header block to standard output. */
@@ -58,12 +61,16 @@ public:
 
     /** Fills "getParam" and "postParam" of `out` from query string and body. */
     bool InitParam(Json::Value& out);
+    /** The query string's parameters; 101 in the response if it is no text. */
     bool InitGetParam(Json::Value& out);
-    /** Logs an exception caught while the body was read. */
+    /** The body's parameters; standard input is at its end afterwards. Logs an exception caught while the body was
+     * read. */
     bool InitPostParam(Json::Value& out);
     /** Turns one line of pairs, enciphered or clear, into members of `out`. */
     bool DetectAndDecryptParamLine(const std::string& line, Json::Value& out);
+    /** Deciphers an envelope into members of `out`; false, and nothing logged, if it cannot be deciphered. */
     bool DecryptParam(const std::string& cipherText, Json::Value& out);
+    /** Deciphers the AES pair among the parameters in place, if there is one; false if it cannot be deciphered. */
     bool DecryptAESParam(Json::Value& params);
     /** The first form fields of an upload, which name the API. */
     bool LoadUploadAPIDesc(Json::Value& out);

@@ -17,8 +17,7 @@ namespace {
 
 constexpr int kUserNameSize = 493;
 /** Everything but the request's own token, which a library with a session id of its own does not have. */
-constexpr int kAuthFlags =
-    ZOVA_CGI_AUTH_LOAD | ZOVA_CGI_AUTH_IDLE | ZOVA_CGI_AUTH_ADDRESS | ZOVA_CGI_AUTH_REFRESH;
+constexpr int kAuthFlags = ZOVA_CGI_AUTH_LOAD | ZOVA_CGI_AUTH_IDLE | ZOVA_CGI_AUTH_ADDRESS | ZOVA_CGI_AUTH_REFRESH;
 
 struct CgiDeleter {
     void operator()(ZovaCgi* cgi) const { ZovaCgiFree(cgi); }
@@ -96,7 +95,8 @@ bool APIAuth::UpdateTimeout(APIRequest* request) {
     ZovaCgi record{};
     const std::unique_ptr<ZovaCgi, CgiDeleter> owner(&record);
     ZovaCgiInit("", &record);
-    const std::string path = std::string(record.sessDir == nullptr ? "" : record.sessDir) + "/" + request->GetSessionID();
+    const std::string path =
+        std::string(record.sessDir == nullptr ? "" : record.sessDir) + "/" + request->GetSessionID();
     const std::unique_ptr<char, FreeDeleter> resolved(realpath(path.c_str(), nullptr));
     // Path parts in the id, or a link in the store, lead elsewhere.
     return resolved && path == resolved.get() && QLIBCFileUTime(resolved.get(), 1, 0) >= 0;

@@ -4,6 +4,8 @@ namespace ZOVA {
 
 // Bearer tokens are not looked at yet: every call counts as one without.
 
-bool APIAuth::CheckAccessToken(APIRequest*) { return false; }
+bool APIAuth::CheckAccessToken(APIRequest*) {
+    return false;
+}
 
 }  // namespace ZOVA

@@ -50,15 +50,25 @@ APIRunner::~APIRunner() {
 
 // ---- hooks of the bare runner, which lets everything through ----
 
-bool APIRunner::CheckSharingPermission(APIRequest*, APIResponse*) { return true; }
+bool APIRunner::CheckSharingPermission(APIRequest*, APIResponse*) {
+    return true;
+}
 
-bool APIRunner::NeedPermission(APIRequest*) { return false; }
+bool APIRunner::NeedPermission(APIRequest*) {
+    return false;
+}
 
-bool APIRunner::CheckPermission(APIRequest*, APIResponse*) { return true; }
+bool APIRunner::CheckPermission(APIRequest*, APIResponse*) {
+    return true;
+}
 
-bool APIRunner::HandleUpload(APIRequest*, APIResponse*) { return true; }
+bool APIRunner::HandleUpload(APIRequest*, APIResponse*) {
+    return true;
+}
 
-bool APIRunner::SkipPermission(APIRequest*) { return true; }
+bool APIRunner::SkipPermission(APIRequest*) {
+    return true;
+}
 
 // ---- the frame ----
 
@@ -171,7 +181,9 @@ bool APIRunner::ProcessEntry(APIRequest* call, APIResponse* answer) {
 
 // ---- the name of the process ----
 
-void APIRunner::SetArgs(int argc, char** argv) { d->SetArgs(argc, argv); }
+void APIRunner::SetArgs(int argc, char** argv) {
+    d->SetArgs(argc, argv);
+}
 
 bool APIRunner::SetProcessName(APIRequest* call, APIResponse* answer) {
     const std::string api = call->GetAPIClass();

@@ -165,8 +165,7 @@ const Json::Value& APIRunner::GetMethod(const std::string& api, int version, con
     return defaults;
 }
 
-bool APIRunner::GetMethodAttr(const std::string& api, int version, const std::string& method,
-                              const std::string& attr) {
+bool APIRunner::GetMethodAttr(const std::string& api, int version, const std::string& method, const std::string& attr) {
     const Json::Value& attributes = GetMethod(api, version, method);
     if (Json::isObject(attributes)) {
         return Json::asBool(Json::member(attributes, attr));

@@ -8,7 +8,9 @@
 
 namespace ZOVA {
 
-void DirectoryScope::Save() { saved = getcwd(nullptr, 0); }
+void DirectoryScope::Save() {
+    saved = getcwd(nullptr, 0);
+}
 
 void DirectoryScope::Restore() {
     if (saved == nullptr) {

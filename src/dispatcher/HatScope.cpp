@@ -32,7 +32,9 @@ Json::Value StackFromEnvironment() {
     return stack;
 }
 
-void StackToEnvironment(const Json::Value& stack) { setenv(kStackVariable, Json::toString(stack).c_str(), 1); }
+void StackToEnvironment(const Json::Value& stack) {
+    setenv(kStackVariable, Json::toString(stack).c_str(), 1);
+}
 
 /** Enters the first of the call's hats that exists, and gives its name; null if none can be entered. */
 const char* EnterFirst(const std::string& methodHat, const std::string& apiHat) {

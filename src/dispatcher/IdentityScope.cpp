@@ -68,7 +68,7 @@ bool ResetIdentity(const std::string& user, bool keep) {
         uid_t uid = 0;
         gid_t gid = 0;
         if (ZOVAUserGetUGID(user.c_str(), &uid, &gid) == 0 && uid == geteuid() && gid == getegid()) {
-            return true;
+            return keep || IsLasting();
         }
     }
     return ResetCredentialsByName(user.c_str(), keep) && (keep || IsLasting());

@@ -28,7 +28,9 @@ struct IdentityPlan {
     std::string login;
 };
 
-void Answer(APIResponse& response, int code) { response.SetError(code, Json::Value()); }
+void Answer(APIResponse& response, int code) {
+    response.SetError(code, Json::Value());
+}
 
 /** The first row for the call, or the row that ends the table. */
 template <class Row>

@@ -2,12 +2,19 @@
 
 #include <sys/resource.h>
 
+#include <cerrno>
+
 #include "base/ErrnoGuard.h"
 
 namespace ZOVA {
 
-NiceScope::NiceScope(int priority) : oldPriority(getpriority(PRIO_PROCESS, 0)), changed(oldPriority != priority) {
-    if (changed) {
+NiceScope::NiceScope(int priority) : oldPriority(0), changed(false) {
+    base::ErrnoGuard errnoGuard;
+    errno = 0;
+    oldPriority = getpriority(PRIO_PROCESS, 0);
+    // -1 is a nice value too. One that cannot be read could not be given back.
+    if (errno == 0 && oldPriority != priority) {
+        changed = true;
         setpriority(PRIO_PROCESS, 0, priority);
     }
 }

@@ -5,6 +5,7 @@ namespace ZOVA {
 /** The nice value of one call; logs nothing. */
 class [[nodiscard]] NiceScope {
 public:
+    /** Sets the value; leaves it alone where the old one cannot be read. */
     explicit NiceScope(int priority);
     NiceScope(const NiceScope&) = delete;
     NiceScope& operator=(const NiceScope&) = delete;

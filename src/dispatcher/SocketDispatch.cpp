@@ -5,7 +5,9 @@ namespace ZOVA {
 
 // No daemon is served yet: a description's "socket" counts as one that is not there, and the library serves.
 
-bool APIRunner::CanProcessSocket(APIRequest*) { return false; }
+bool APIRunner::CanProcessSocket(APIRequest*) {
+    return false;
+}
 
 bool APIRunner::ProcessSocket(APIRequest*, APIResponse* answer) {
     answer->SetError(WEBAPI_ERR_INTERNAL, Json::Value());

@@ -21,15 +21,29 @@ void OpenNull(std::optional<FileBuffer>& buffer, int flags, std::ios_base::openm
     }
 }
 
+/** Setting the buffer clears the state; a stream that reports its state by exceptions stays with the cleared one. */
+void GiveBack(std::ios& stream, std::streambuf*& saved, std::ios_base::iostate state) {
+    if (saved == nullptr) {
+        return;
+    }
+    stream.rdbuf(saved);
+    saved = nullptr;
+    if ((stream.exceptions() & state) == 0) {
+        stream.setstate(state);
+    }
+}
+
 }  // namespace
 
 StreamScope::StreamScope(bool keepInput, bool keepOutput) {
     if (!keepInput) {
         OpenNull(inputFile, O_RDONLY, std::ios_base::in);
+        inputState = std::cin.rdstate();
         savedInput = std::cin.rdbuf(&*inputFile);
     }
     if (!keepOutput) {
         OpenNull(outputFile, O_WRONLY | O_TRUNC, std::ios_base::out | std::ios_base::trunc);
+        outputState = std::cout.rdstate();
         savedOutput = std::cout.rdbuf(&*outputFile);
     }
 }
@@ -49,14 +63,8 @@ void StreamScope::CloseFiles() {
 }
 
 void StreamScope::Restore() {
-    if (savedInput != nullptr) {
-        std::cin.rdbuf(savedInput);
-        savedInput = nullptr;
-    }
-    if (savedOutput != nullptr) {
-        std::cout.rdbuf(savedOutput);
-        savedOutput = nullptr;
-    }
+    GiveBack(std::cin, savedInput, inputState);
+    GiveBack(std::cout, savedOutput, outputState);
 }
 
 }  // namespace ZOVA

@@ -2,6 +2,7 @@
 
 #include <ext/stdio_filebuf.h>
 
+#include <ios>
 #include <optional>
 #include <streambuf>
 
@@ -30,6 +31,8 @@ private:
     std::optional<FileBuffer> outputFile;
     std::streambuf* savedInput = nullptr;
     std::streambuf* savedOutput = nullptr;
+    std::ios_base::iostate inputState = std::ios_base::goodbit;
+    std::ios_base::iostate outputState = std::ios_base::goodbit;
 };
 
 }  // namespace ZOVA

@@ -3,6 +3,7 @@
 #include <json/value.h>
 
 #include <ctime>
+#include <limits>
 
 #include "webapi/APIRequest.h"
 #include "webapi/APIRunner.h"
@@ -53,7 +54,8 @@ bool AddOne(const std::string& path, const std::string& key) {
     }
     Json::Value& counter = counters[key];
     if (counter.type() == Json::objectValue) {
-        counter["count"] = static_cast<Json::Int64>(Json::asInt64(Json::member(counter, "count")) + 1);
+        const Json::Int64 count = Json::asInt64(Json::member(counter, "count"));
+        counter["count"] = count < std::numeric_limits<Json::Int64>::max() ? count + 1 : count;
     } else {
         counter = Json::Value(Json::objectValue);
         counter["count"] = 1;

@@ -81,8 +81,12 @@ bool APIBase::ClearData(const std::string& section, const std::string& key) {
     return found->removeMember(key, nullptr);
 }
 
-const Json::Value& APIBase::Serialize() const { return data; }
+const Json::Value& APIBase::Serialize() const {
+    return data;
+}
 
-void APIBase::Deserialize(Json::Value& in) { data.swap(in); }
+void APIBase::Deserialize(Json::Value& in) {
+    data.swap(in);
+}
 
 }  // namespace ZOVA

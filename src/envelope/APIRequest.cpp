@@ -26,7 +26,9 @@ APIRequest::APIRequest(const Json::Value& init) : d(new APIRequestPrivate(this))
 
 APIRequest::APIRequest(const APIRequest& other) : d(new APIRequestPrivate(*other.d, this)) {}
 
-APIRequest::~APIRequest() { delete d; }
+APIRequest::~APIRequest() {
+    delete d;
+}
 
 void APIRequest::InitEnv(const Json::Value& env) {
     d->SetData("environ", env, true);
@@ -59,7 +61,9 @@ void APIRequest::InitSession(const Json::Value& session) {
     d->SetData("session", session, false);
 }
 
-const Json::Value& APIRequest::Serialize() const { return d->Serialize(); }
+const Json::Value& APIRequest::Serialize() const {
+    return d->Serialize();
+}
 
 void APIRequest::Deserialize(Json::Value& in) {
     d->Deserialize(in);
@@ -68,25 +72,37 @@ void APIRequest::Deserialize(Json::Value& in) {
 
 // ---- accessors ----
 
-std::string APIRequest::GetAPIClass() { return Json::asString(d->PrivateValue("api")); }
+std::string APIRequest::GetAPIClass() {
+    return Json::asString(d->PrivateValue("api"));
+}
 
-int APIRequest::GetAPIVersion() { return Json::asInt(d->PrivateValue("version")); }
+int APIRequest::GetAPIVersion() {
+    return Json::asInt(d->PrivateValue("version"));
+}
 
-std::string APIRequest::GetAPIMethod() { return Json::asString(d->PrivateValue("method")); }
+std::string APIRequest::GetAPIMethod() {
+    return Json::asString(d->PrivateValue("method"));
+}
 
-int APIRequest::GetRequestMethod() { return Json::asInt(d->PrivateValue("requestMethod")); }
+int APIRequest::GetRequestMethod() {
+    return Json::asInt(d->PrivateValue("requestMethod"));
+}
 
 Json::Value APIRequest::GetAPIInfo(const std::string& key, const Json::Value& fallback) const {
     return d->GetData("reqLib", key, fallback);
 }
 
-bool APIRequest::HasEnv(const std::string& key) const { return d->HasData("environ", key); }
+bool APIRequest::HasEnv(const std::string& key) const {
+    return d->HasData("environ", key);
+}
 
 Json::Value APIRequest::GetEnv(const std::string& key, const Json::Value& fallback) const {
     return d->GetData("environ", key, fallback);
 }
 
-bool APIRequest::HasParam(const std::string& key) const { return d->HasData("param", key); }
+bool APIRequest::HasParam(const std::string& key) const {
+    return d->HasData("param", key);
+}
 
 Json::Value APIRequest::GetParam(const std::string& key, const Json::Value& fallback) const {
     return d->GetData("param", key, fallback);
@@ -96,7 +112,9 @@ const Json::Value& APIRequest::GetParamRef(const std::string& key, const Json::V
     return d->GetData("param", key, fallback);
 }
 
-bool APIRequest::HasCookie(const std::string& key) const { return d->HasData("cookie", key); }
+bool APIRequest::HasCookie(const std::string& key) const {
+    return d->HasData("cookie", key);
+}
 
 std::string APIRequest::GetCookie(const std::string& key, const std::string& fallback) const {
     // The store reads an empty key as the whole section, yet "=v" is a cookie of the empty name.
@@ -109,13 +127,17 @@ bool APIRequest::SetCookie(const std::string& key, const std::string& value) {
     return d->SetData("cookie", key, value, true);
 }
 
-bool APIRequest::HasAttr(const std::string& key) const { return d->HasData("attr", key); }
+bool APIRequest::HasAttr(const std::string& key) const {
+    return d->HasData("attr", key);
+}
 
 Json::Value APIRequest::GetAttr(const std::string& key, const Json::Value& fallback) const {
     return d->GetData("attr", key, fallback);
 }
 
-void APIRequest::SetAttr(const std::string& key, const Json::Value& value) { d->SetData("attr", key, value, false); }
+void APIRequest::SetAttr(const std::string& key, const Json::Value& value) {
+    d->SetData("attr", key, value, false);
+}
 
 // ---- kind of request ----
 
@@ -129,22 +151,38 @@ bool APIRequest::IsUploadRequest() const {
     return type.find("multipart/form-data") != std::string::npos || IsSliceUploadRequest();
 }
 
-bool APIRequest::IsPollingTask() const { return HasEnv("task_id") && HasEnv("task_user"); }
+bool APIRequest::IsPollingTask() const {
+    return HasEnv("task_id") && HasEnv("task_user");
+}
 
-std::string APIRequest::GetPollingTaskId() const { return Json::asString(GetEnv("full_task_id", "")); }
+std::string APIRequest::GetPollingTaskId() const {
+    return Json::asString(GetEnv("full_task_id", ""));
+}
 
 // ---- sharing links ----
 
-bool APIRequest::IsSharing() const { return !d->sharingId.empty(); }
+bool APIRequest::IsSharing() const {
+    return !d->sharingId.empty();
+}
 
-std::string APIRequest::GetSharingID() const { return d->sharingId; }
+std::string APIRequest::GetSharingID() const {
+    return d->sharingId;
+}
 
-std::string APIRequest::GetSharingSID() const { return d->sharingSid; }
+std::string APIRequest::GetSharingSID() const {
+    return d->sharingSid;
+}
 
-sharing::record::Entry APIRequest::GetSharingEntry() const { return d->sharingEntry; }
+sharing::record::Entry APIRequest::GetSharingEntry() const {
+    return d->sharingEntry;
+}
 
-sharing::record::Session APIRequest::GetSharingSession() const { return d->sharingSession; }
+sharing::record::Session APIRequest::GetSharingSession() const {
+    return d->sharingSession;
+}
 
-sharing::record::Token APIRequest::GetSharingToken() const { return d->sharingToken; }
+sharing::record::Token APIRequest::GetSharingToken() const {
+    return d->sharingToken;
+}
 
 }  // namespace ZOVA

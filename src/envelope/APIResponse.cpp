@@ -10,33 +10,57 @@ namespace ZOVA {
 
 APIResponse::APIResponse(APIRequest* request) : d(new APIResponsePrivate(request, this)) {}
 
-APIResponse::~APIResponse() { delete d; }
+APIResponse::~APIResponse() {
+    delete d;
+}
 
-void APIResponse::SetError(int code, const Json::Value& extra) { d->SetOutcome(code, extra); }
+void APIResponse::SetError(int code, const Json::Value& extra) {
+    d->SetOutcome(code, extra);
+}
 
-void APIResponse::SetSuccess(const Json::Value& data) { SetError(WEBAPI_ERR_NONE, data); }
+void APIResponse::SetSuccess(const Json::Value& data) {
+    SetError(WEBAPI_ERR_NONE, data);
+}
 
-int APIResponse::GetError() const { return Json::asInt(Json::member(d->Serialize(), "code")); }
+int APIResponse::GetError() const {
+    return Json::asInt(Json::member(d->Serialize(), "code"));
+}
 
 Json::Value APIResponse::GetBody() const {
     return Json::hasMember(d->Serialize(), "body") ? d->Serialize()["body"] : Json::Value(Json::objectValue);
 }
 
-bool APIResponse::IsEnableOutput() const { return Json::asBool(d->GetData("option", "isDownload", true)); }
+bool APIResponse::IsEnableOutput() const {
+    return Json::asBool(d->GetData("option", "isDownload", true));
+}
 
-void APIResponse::SetEnableOutput(bool enable) { d->SetData("option", "isDownload", enable, false); }
+void APIResponse::SetEnableOutput(bool enable) {
+    d->SetData("option", "isDownload", enable, false);
+}
 
-bool APIResponse::GetHttpdRestart() const { return Json::asBool(d->GetData("option", "restart_httpd", false)); }
+bool APIResponse::GetHttpdRestart() const {
+    return Json::asBool(d->GetData("option", "restart_httpd", false));
+}
 
-void APIResponse::SetHttpdRestart(bool restart) { d->SetData("option", "restart_httpd", restart, false); }
+void APIResponse::SetHttpdRestart(bool restart) {
+    d->SetData("option", "restart_httpd", restart, false);
+}
 
-std::string APIResponse::GetServerError() const { return Json::asString(d->GetData("headers", "x-request-error", "")); }
+std::string APIResponse::GetServerError() const {
+    return Json::asString(d->GetData("headers", "x-request-error", ""));
+}
 
-void APIResponse::SetServerError(const std::string& word) { d->SetData("headers", "x-request-error", word, true); }
+void APIResponse::SetServerError(const std::string& word) {
+    d->SetData("headers", "x-request-error", word, true);
+}
 
-bool APIResponse::HasServerError() const { return d->HasData("headers", "x-request-error"); }
+bool APIResponse::HasServerError() const {
+    return d->HasData("headers", "x-request-error");
+}
 
-void* APIResponse::GetCallbackFuncs() { return &d->callbacks; }
+void* APIResponse::GetCallbackFuncs() {
+    return &d->callbacks;
+}
 
 void APIResponse::SetCallbackFunc(CallbackFunc function, void* argument) {
     if (getenv("in_zovaapid") != nullptr) {
@@ -63,8 +87,12 @@ void APIResponse::SetCallbackFuncs(void* list) {
     }
 }
 
-const Json::Value& APIResponse::Serialize() const { return d->Serialize(); }
+const Json::Value& APIResponse::Serialize() const {
+    return d->Serialize();
+}
 
-void APIResponse::Deserialize(Json::Value& in) { d->Deserialize(in); }
+void APIResponse::Deserialize(Json::Value& in) {
+    d->Deserialize(in);
+}
 
 }  // namespace ZOVA

@@ -16,7 +16,9 @@ APIResponsePrivate::APIResponsePrivate(APIRequest* answeredRequest, APIResponse*
     SetData("headers", "Content-type", "application/json; charset=\"UTF-8\"", true);
 }
 
-APIResponsePrivate::~APIResponsePrivate() { delete task; }
+APIResponsePrivate::~APIResponsePrivate() {
+    delete task;
+}
 
 void APIResponsePrivate::SetOutcome(int code, const Json::Value& extra) {
     if (task == nullptr && request != nullptr && request->IsPollingTask()) {

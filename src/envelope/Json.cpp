@@ -67,6 +67,22 @@ Integer FromReal(double number) {
     return number >= low && number < limit ? static_cast<Integer>(number) : 0;
 }
 
+/** What the stock writer makes of an infinite number; no JSON reader takes it back. */
+constexpr const char* kInfinity = "1e+9999";
+
+/** Turns every number that JSON cannot hold into null. */
+void MakeFinite(Value& value) {
+    if (value.type() == realValue) {
+        if (!std::isfinite(value.asDouble())) {
+            value = Value();
+        }
+    } else if (value.type() == arrayValue || value.type() == objectValue) {
+        for (Value& element : value) {
+            MakeFinite(element);
+        }
+    }
+}
+
 bool ReadText(int fd, std::size_t size, std::string& text) {
     text.resize(size);
     std::size_t done = 0;
@@ -149,7 +165,13 @@ std::string toString(const Value& value) {
     builder["indentation"] = "";
     builder["emitUTF8"] = true;
     try {
-        return writeString(builder, value);
+        std::string text = writeString(builder, value);
+        if (text.find(kInfinity) == std::string::npos) {
+            return text;
+        }
+        Value finite = value;
+        MakeFinite(finite);
+        return writeString(builder, finite);
     } catch (const std::exception&) {
         return "null";
     }
@@ -176,9 +198,13 @@ ArrayIndex searchArrayIndex(const Value& array, const Value& element) {
     return Value::maxUInt;
 }
 
-bool isObject(const Value& value) { return value.type() == objectValue || value.type() == nullValue; }
+bool isObject(const Value& value) {
+    return value.type() == objectValue || value.type() == nullValue;
+}
 
-bool isArray(const Value& value) { return value.type() == arrayValue || value.type() == nullValue; }
+bool isArray(const Value& value) {
+    return value.type() == arrayValue || value.type() == nullValue;
+}
 
 bool hasMember(const Value& value, const std::string& name) {
     return value.type() == objectValue && value.find(name.data(), name.data() + name.size()) != nullptr;

@@ -17,7 +17,7 @@ constexpr int kKeyTextSize = 33;
 
 /** Takes a member out as text. */
 std::string TakeText(Json::Value& object, const char* name) {
-    const std::string text = Json::asString(object[name]);
+    std::string text = Json::asString(object[name]);
     object.removeMember(name);
     return text;
 }
@@ -45,6 +45,8 @@ bool DecipherEnvelope(const std::string& cipherText, Json::Value& out) {
     return ZovaCgiDecryptParam(text.data()) != 0 && WebAPIUtil::strPairToJsonObj(text.data(), out, true, true);
 }
 
-bool APIRequestPrivate::DecryptParam(Json::Value&) { return true; }
+bool APIRequestPrivate::DecryptParam(Json::Value&) {
+    return true;
+}
 
 }  // namespace ZOVA

@@ -40,35 +40,65 @@ std::string PreferenceDirectory(int (*query)(const char*, char*, int), const std
 
 // ---- plain reads of the session ----
 
-std::string APIRequest::GetLoginUserName() const { return Json::asString(d->GetData("session", "username", "")); }
+std::string APIRequest::GetLoginUserName() const {
+    return Json::asString(d->GetData("session", "username", ""));
+}
 
-void APIRequest::SetLoginUserName(const std::string& name) { d->SetData("session", "username", name, true); }
+void APIRequest::SetLoginUserName(const std::string& name) {
+    d->SetData("session", "username", name, true);
+}
 
-bool APIRequest::IsAdmin() const { return Json::asBool(d->GetData("session", "isAdmin", "")); }
+bool APIRequest::IsAdmin() const {
+    return Json::asBool(d->GetData("session", "isAdmin", ""));
+}
 
-bool APIRequest::IsSkipCheckIP() const { return Json::asBool(d->GetData("session", "isSkipCheckIP", true)); }
+bool APIRequest::IsSkipCheckIP() const {
+    return Json::asBool(d->GetData("session", "isSkipCheckIP", true));
+}
 
-bool APIRequest::IsTimeout() const { return Json::asBool(d->GetData("session", "isTimeout", true)); }
+bool APIRequest::IsTimeout() const {
+    return Json::asBool(d->GetData("session", "isTimeout", true));
+}
 
-int APIRequest::GetTimeoutDuration() const { return Json::asInt(d->GetData("session", "timeout", 0)); }
+int APIRequest::GetTimeoutDuration() const {
+    return Json::asInt(d->GetData("session", "timeout", 0));
+}
 
-bool APIRequest::IsAuthorized() const { return Json::asBool(d->GetData("session", "isAuthorized", false)); }
+bool APIRequest::IsAuthorized() const {
+    return Json::asBool(d->GetData("session", "isAuthorized", false));
+}
 
-std::string APIRequest::GetApplication() const { return Json::asString(d->GetData("session", "app", "")); }
+std::string APIRequest::GetApplication() const {
+    return Json::asString(d->GetData("session", "app", ""));
+}
 
-std::string APIRequest::GetWebAPIPriv() const { return Json::asString(d->GetData("session", "webapi", "")); }
+std::string APIRequest::GetWebAPIPriv() const {
+    return Json::asString(d->GetData("session", "webapi", ""));
+}
 
-std::string APIRequest::GetSessionFilePath() const { return Json::asString(d->GetData("session", "sessFile", "")); }
+std::string APIRequest::GetSessionFilePath() const {
+    return Json::asString(d->GetData("session", "sessFile", ""));
+}
 
-std::string APIRequest::GetSessionID() const { return GetCookie("id", ""); }
+std::string APIRequest::GetSessionID() const {
+    return GetCookie("id", "");
+}
 
-std::string APIRequest::GetRemoteIP() const { return Json::asString(d->GetData("environ", "ZOVA_REMOTE_IP", "")); }
+std::string APIRequest::GetRemoteIP() const {
+    return Json::asString(d->GetData("environ", "ZOVA_REMOTE_IP", ""));
+}
 
-std::string APIRequest::GetUILanguage() const { return Json::asString(d->GetData("session", "uiLang", "enu")); }
+std::string APIRequest::GetUILanguage() const {
+    return Json::asString(d->GetData("session", "uiLang", "enu"));
+}
 
-bool APIRequest::IsTokenEnable() const { return Json::asBool(d->GetData("session", "tokenEnable", false)); }
+bool APIRequest::IsTokenEnable() const {
+    return Json::asBool(d->GetData("session", "tokenEnable", false));
+}
 
-bool APIRequest::IsDemoMode() const { return false; }
+bool APIRequest::IsDemoMode() const {
+    return false;
+}
 
 void APIRequest::SetAuthResult(_tag_authorized_result_ result) {
     d->SetData("session", "authResult", static_cast<int>(result), false);
@@ -79,7 +109,9 @@ _tag_authorized_result_ APIRequest::GetAuthResult() const {
         Json::asInt(d->GetData("session", "authResult", static_cast<int>(AUTHORIZED_RESULT_INVALID))));
 }
 
-bool APIRequest::HasAppPriv(const std::string& app) const { return d->GetData("session", "appPriv", "") == app; }
+bool APIRequest::HasAppPriv(const std::string& app) const {
+    return d->GetData("session", "appPriv", "") == app;
+}
 
 // ---- questions to the system, asked once ----
 
@@ -96,7 +128,9 @@ unsigned int APIRequestPrivate::GetLoginUID() {
     return uid;
 }
 
-unsigned int APIRequest::GetLoginUID() { return d->GetLoginUID(); }
+unsigned int APIRequest::GetLoginUID() {
+    return d->GetLoginUID();
+}
 
 int APIRequest::GetAllowUser() {
     const int known = Json::asInt(d->GetData("session", "allowUser", 0));

@@ -72,8 +72,8 @@ APIParameter<T> APIRequest::GetAndCheckIntegral(const std::string& key, PARAM_NE
     return d->GetAndCheckParam<T>(key, necessity == PARAM_REQUIRED, Json::objectValue, validator);
 }
 
-template APIParameter<long long> APIRequest::GetAndCheckIntegral<long long>(
-    const std::string&, PARAM_NECESSITY, APIParameter<long long>::Validator) const;
+template APIParameter<long long> APIRequest::GetAndCheckIntegral<long long>(const std::string&, PARAM_NECESSITY,
+                                                                            APIParameter<long long>::Validator) const;
 template APIParameter<unsigned int> APIRequest::GetAndCheckIntegral<unsigned int>(
     const std::string&, PARAM_NECESSITY, APIParameter<unsigned int>::Validator) const;
 template APIParameter<unsigned long long> APIRequest::GetAndCheckIntegral<unsigned long long>(

@@ -95,7 +95,9 @@ Json::Value APIResponse::GetCookies() const {
 
 // ---- headers and status ----
 
-bool APIResponse::HasHeader(const std::string& name) const { return d->HasData("headers", name); }
+bool APIResponse::HasHeader(const std::string& name) const {
+    return d->HasData("headers", name);
+}
 
 bool APIResponse::SetHeader(const std::string& name, const std::string& value) {
     return d->SetData("headers", name, value, true);
@@ -105,7 +107,9 @@ std::string APIResponse::GetHeader(const std::string& name, const std::string& f
     return Json::asString(d->GetData("headers", name, fallback));
 }
 
-Json::Value APIResponse::GetHeaders() const { return d->GetData("headers", Json::Value(Json::objectValue)); }
+Json::Value APIResponse::GetHeaders() const {
+    return d->GetData("headers", Json::Value(Json::objectValue));
+}
 
 _tag_HTTP_STATUS_CODE APIResponse::GetStatus() const {
     // The number in front, as a stream would read it: blanks before it and text behind it do not count.

@@ -3,7 +3,7 @@
 #include <signal.h>
 #include <unistd.h>
 
-#include <memory>
+#include <cerrno>
 #include <new>
 
 #include "base/Log.h"
@@ -23,8 +23,19 @@ constexpr useconds_t kParentPollMicroseconds = 200000;
 constexpr const char* kStopped = "compound stop when error.";
 constexpr const char* kTransferRefused = "not allow upload or download API.";
 
-bool HasCallbacks(APIResponse& response) {
-    return !static_cast<const ResponseCallbackList*>(response.GetCallbackFuncs())->empty();
+ResponseCallbackList& Callbacks(APIResponse& response) {
+    return *static_cast<ResponseCallbackList*>(response.GetCallbackFuncs());
+}
+
+/** Also when the child has become a user who may not signal it. */
+bool IsAlive(int process) {
+    return kill(process, 0) == 0 || errno == EPERM;
+}
+
+bool AllowsTransfer(APIRunner& runner, APIRequest& call) {
+    const Json::Value& attributes = runner.GetMethod(call.GetAPIClass(), call.GetAPIVersion(), call.GetAPIMethod());
+    return Json::asBool(Json::member(attributes, "allowUpload")) ||
+           Json::asBool(Json::member(attributes, "allowDownload"));
 }
 
 }  // namespace
@@ -118,13 +129,6 @@ int CompoundHandler::CompoundProcess() {
 
 // ---- one entry ----
 
-bool CompoundHandler::AllowsTransfer() const {
-    const Json::Value& attributes =
-        runner->GetMethod(subRequest->GetAPIClass(), subRequest->GetAPIVersion(), subRequest->GetAPIMethod());
-    return Json::asBool(Json::member(attributes, "allowUpload")) ||
-           Json::asBool(Json::member(attributes, "allowDownload"));
-}
-
 int CompoundHandler::CompoundProcessEntry(const Json::Value& entry, unsigned int index) {
     APIRequestPrivate::Of(*subRequest).SetCallName(CallName());
     Json::Value params(Json::objectValue);
@@ -135,7 +139,7 @@ int CompoundHandler::CompoundProcessEntry(const Json::Value& entry, unsigned int
     if (stopWhenError && hasFail) {
         errorMessage = kStopped;
         code = WEBAPI_ERR_COMPOUND_STOPPED;
-    } else if (AllowsTransfer()) {
+    } else if (AllowsTransfer(*runner, *subRequest)) {
         errorMessage = kTransferRefused;
         code = WEBAPI_ERR_COMPOUND_TRANSFER_REFUSED;
     } else if (parallelMode || !(runner->GetMethodAttr(subRequest, "grantable") ||
@@ -202,6 +206,14 @@ bool CompoundHandler::ProcessFork(std::pair<Pipe*, unsigned int>& pair) {
 
 void CompoundHandler::RunChild(Pipe& pipe, int parent) {
     pipe.WriteOnly(-1);
+    // An end that a sibling holds would keep a writer waiting whose reader has gone.
+    for (const auto& pair : pipeList) {
+        if (pair.first != &pipe) {
+            pair.first->Close();
+        }
+    }
+    // Those of earlier entries are the parent's to run.
+    Callbacks(*subResponse).clear();
     runner->Process(subRequest, subResponse);
     Json::Value message(Json::objectValue);
     PrepareCompundResponse(message["result"], message["info"]);
@@ -209,8 +221,8 @@ void CompoundHandler::RunChild(Pipe& pipe, int parent) {
         WEBAPI_LOG(LOG_ERR, "write json failed");
     }
     pipe.Close();
-    if (HasCallbacks(*subResponse)) {
-        while (kill(parent, 0) == 0) {
+    if (!Callbacks(*subResponse).empty()) {
+        while (IsAlive(parent)) {
             usleep(kParentPollMicroseconds);
         }
         runner->HandleCallback(subResponse);

@@ -65,17 +65,18 @@ void PumpBody(Pipe& output, int target) {
     }
 }
 
+Json::Value Failure(int code) {
+    Json::Value result(Json::objectValue);
+    result["success"] = false;
+    result["error"]["code"] = code;
+    return result;
+}
+
 }  // namespace
 
 ExecHandler::ExecHandler(const ExecParam& execParam) : param(&execParam) {}
 
 ExecHandler::~ExecHandler() = default;
-
-void ExecHandler::Fail(int code) {
-    execResult = Json::Value(Json::objectValue);
-    execResult["success"] = false;
-    execResult["error"]["code"] = code;
-}
 
 Json::Value ExecHandler::Process() {
     DirectoryScope directory;
@@ -101,7 +102,7 @@ Json::Value ExecHandler::Process() {
 
 bool ExecHandler::CheckParams() {
     if (param->GetAPI().empty() || param->GetMethod().empty() || param->GetRunner().empty()) {
-        Fail(WEBAPI_ERR_BAD_REQUEST);
+        execResult = Failure(WEBAPI_ERR_BAD_REQUEST);
         WEBAPI_LOG(LOG_ERR, "missing parameter.");
         return false;
     }
@@ -146,7 +147,7 @@ void ExecHandler::RunFork() {
     pipe.Init();
     const int child = QLIBCProcForkEx(kForkFlags);
     if (child == -1) {
-        Fail(WEBAPI_ERR_INTERNAL);
+        execResult = Failure(WEBAPI_ERR_INTERNAL);
         WEBAPI_LOG(LOG_ERR, "fork failed");
         return;
     }
@@ -158,7 +159,7 @@ void ExecHandler::RunFork() {
     }
     pipe.ReadOnly(-1);
     if (!pipe.ReadJson(execResult)) {
-        Fail(WEBAPI_ERR_INTERNAL);
+        execResult = Failure(WEBAPI_ERR_INTERNAL);
         WEBAPI_LOG(LOG_ERR, "read json failed");
     }
 }
@@ -168,9 +169,12 @@ void ExecHandler::RunForkForStdout() {
     Pipe output;
     result.Init();
     output.Init();
+    // What this process has yet to write would otherwise come out of the child too.
+    fflush(stdout);
+    std::cout.flush();
     const int child = QLIBCProcForkEx(kForkFlags);
     if (child == -1) {
-        Fail(WEBAPI_ERR_INTERNAL);
+        execResult = Failure(WEBAPI_ERR_INTERNAL);
         WEBAPI_LOG(LOG_ERR, "fork failed");
         return;
     }
@@ -188,7 +192,7 @@ void ExecHandler::RunForkForStdout() {
     output.ReadOnly(-1);
     PumpBody(output, param->GetOutputFd());
     if (!result.ReadJson(execResult)) {
-        Fail(WEBAPI_ERR_INTERNAL);
+        execResult = Failure(WEBAPI_ERR_INTERNAL);
         WEBAPI_LOG(LOG_ERR, "read json failed");
     }
 }

@@ -38,11 +38,17 @@ ExecParam& ExecParam::operator=(const ExecParam& other) {
     return *this;
 }
 
-ExecParam::~ExecParam() { delete d; }
+ExecParam::~ExecParam() {
+    delete d;
+}
 
-const Json::Value& ExecParam::Serialize() const { return d->Serialize(); }
+const Json::Value& ExecParam::Serialize() const {
+    return d->Serialize();
+}
 
-void ExecParam::Deserialize(Json::Value& store) { d->Deserialize(store); }
+void ExecParam::Deserialize(Json::Value& store) {
+    d->Deserialize(store);
+}
 
 ExecParam& ExecParam::SetParams(const Json::Value& params) {
     d->SetData("params", params, false);
@@ -84,20 +90,36 @@ ExecParam& ExecParam::SetOutputFd(int fd) {
     return *this;
 }
 
-std::string ExecParam::GetAPI() const { return Json::asString(d->GetData("params", "api", "")); }
+std::string ExecParam::GetAPI() const {
+    return Json::asString(d->GetData("params", "api", ""));
+}
 
-int ExecParam::GetVersion() const { return Json::asInt(d->GetData("params", "version", 0)); }
+int ExecParam::GetVersion() const {
+    return Json::asInt(d->GetData("params", "version", 0));
+}
 
-std::string ExecParam::GetMethod() const { return Json::asString(d->GetData("params", "method", "")); }
+std::string ExecParam::GetMethod() const {
+    return Json::asString(d->GetData("params", "method", ""));
+}
 
-Json::Value ExecParam::GetParams() const { return d->Object("params"); }
+Json::Value ExecParam::GetParams() const {
+    return d->Object("params");
+}
 
-Json::Value ExecParam::GetEnv() const { return d->Object("env"); }
+Json::Value ExecParam::GetEnv() const {
+    return d->Object("env");
+}
 
-std::string ExecParam::GetRunner() const { return Json::asString(d->GetData("runner", "username", "")); }
+std::string ExecParam::GetRunner() const {
+    return Json::asString(d->GetData("runner", "username", ""));
+}
 
-Json::Value ExecParam::GetAttr() const { return d->Object("attr"); }
+Json::Value ExecParam::GetAttr() const {
+    return d->Object("attr");
+}
 
-int ExecParam::GetOutputFd() const { return Json::asInt(d->GetData("output", "fd", -1)); }
+int ExecParam::GetOutputFd() const {
+    return Json::asInt(d->GetData("output", "fd", -1));
+}
 
 }  // namespace ZOVA

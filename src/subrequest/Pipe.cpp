@@ -9,10 +9,12 @@
 #include <cstring>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "base/ErrnoGuard.h"
 #include "base/Log.h"
+#include "base/UniqueFd.h"
 #include "webapi/Json.h"
 
 namespace ZOVA {
@@ -34,6 +36,12 @@ void CloseEnd(int& fd) {
 /** The pipes that have been opened and not destroyed; made at the first one. */
 std::vector<Pipe*>* openPipes = nullptr;
 
+/** The end above the standard descriptors, which are replaced in a child; none if it is refused. */
+base::UniqueFd AboveStandard(int end) {
+    base::UniqueFd owned(end);
+    return end > STDERR_FILENO ? std::move(owned) : base::UniqueFd(fcntl(end, F_DUPFD_CLOEXEC, STDERR_FILENO + 1));
+}
+
 }  // namespace
 
 Pipe::Pipe() : readFd(-1), writeFd(-1) {}
@@ -50,8 +58,13 @@ bool Pipe::Init() {
     if (pipe2(ends, O_CLOEXEC) != 0) {
         return false;
     }
-    readFd = ends[0];
-    writeFd = ends[1];
+    base::UniqueFd readEnd = AboveStandard(ends[0]);
+    base::UniqueFd writeEnd = AboveStandard(ends[1]);
+    if (!readEnd.IsOpen() || !writeEnd.IsOpen()) {
+        return false;
+    }
+    readFd = readEnd.Release();
+    writeFd = writeEnd.Release();
     if (openPipes == nullptr) {
         openPipes = new std::vector<Pipe*>();
     }
@@ -84,7 +97,9 @@ void Pipe::CloseInherited() {
     }
 }
 
-bool Pipe::IsReadable() const { return readFd >= 0; }
+bool Pipe::IsReadable() const {
+    return readFd >= 0;
+}
 
 bool Pipe::WriteJson(const Json::Value& value) {
     const std::string text = Json::toString(value);

@@ -126,6 +126,8 @@ bool WebEntry::DecryptParam(const std::string& cipherText, Json::Value& out) {
     return DecipherEnvelope(cipherText, out) && (out.empty() || DecryptAESParam(out));
 }
 
-bool WebEntry::DecryptAESParam(Json::Value& params) { return DecipherAES(params); }
+bool WebEntry::DecryptAESParam(Json::Value& params) {
+    return DecipherAES(params);
+}
 
 }  // namespace ZOVA

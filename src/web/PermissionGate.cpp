@@ -24,8 +24,8 @@ constexpr int kLoginRequired = 1;
 constexpr int kLoginOptional = 2;
 
 constexpr int kUserNameSize = 493;
-constexpr int kAuthFlags = ZOVA_CGI_AUTH_LOAD | ZOVA_CGI_AUTH_IDLE | ZOVA_CGI_AUTH_ADDRESS | ZOVA_CGI_AUTH_REFRESH |
-                           ZOVA_CGI_AUTH_TOKEN;
+constexpr int kAuthFlags =
+    ZOVA_CGI_AUTH_LOAD | ZOVA_CGI_AUTH_IDLE | ZOVA_CGI_AUTH_ADDRESS | ZOVA_CGI_AUTH_REFRESH | ZOVA_CGI_AUTH_TOKEN;
 
 constexpr int kLowestResult = -8;
 /** The error of each authorisation result, from -8 to 2. */
@@ -117,15 +117,21 @@ Json::Value SessionOfCall(const APIRequest& login, const std::string& privilege)
     return session;
 }
 
-Json::ArrayIndex SlotOf(bool allowTimeout) { return allowTimeout ? 0 : 1; }
+Json::ArrayIndex SlotOf(bool allowTimeout) {
+    return allowTimeout ? 0 : 1;
+}
 
 }  // namespace
 
 // ---- which calls meet the gate ----
 
-bool WebEntry::NeedPermission(APIRequest* call) { return call == nullptr || AuthLevel(*call) != kLoginOpen; }
+bool WebEntry::NeedPermission(APIRequest* call) {
+    return call == nullptr || AuthLevel(*call) != kLoginOpen;
+}
 
-bool WebEntry::SkipPermission(APIRequest* call) { return call != nullptr && AuthLevel(*call) == kLoginOptional; }
+bool WebEntry::SkipPermission(APIRequest* call) {
+    return call != nullptr && AuthLevel(*call) == kLoginOptional;
+}
 
 // ---- the authorisation, on the process's own request ----
 

@@ -4,6 +4,8 @@
 
 namespace ZOVA {
 
-void RestartHttpd(void*) { zovaw3::ZELM(zovaw3::Engine::CreatePrivate()).RestartService(); }
+void RestartHttpd(void*) {
+    zovaw3::ZELM(zovaw3::Engine::CreatePrivate()).RestartService();
+}
 
 }  // namespace ZOVA

@@ -5,7 +5,9 @@ namespace ZOVA {
 
 // Uploads are not taken yet: neither the form fields that name the API nor the files can be read.
 
-bool WebEntry::LoadUploadAPIDesc(Json::Value&) { return false; }
+bool WebEntry::LoadUploadAPIDesc(Json::Value&) {
+    return false;
+}
 
 bool WebEntry::HandleUpload(APIRequest*, APIResponse* answer) {
     Json::Value extra(Json::objectValue);

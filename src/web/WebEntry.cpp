@@ -4,10 +4,10 @@
 
 #include <cstdlib>
 
+#include "web/RestartHttpd.h"
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
 #include "webapi/Json.h"
-#include "web/RestartHttpd.h"
 #include "zovacgi.h"
 #include "zovasharing.h"
 
@@ -98,21 +98,23 @@ bool WebEntry::TakeCredentialParameters() {
     std::string cookie = ProcessVariable("HTTP_COOKIE");
     std::string sharingHeader = ProcessVariable(SZ_X_SHARING_HEADER);
     // Both separators look at the header as it was found, not at the text that is being built.
-    const char* separator = cookie.empty() ? "" : "; ";
+    const bool cookieCame = !cookie.empty();
     Json::Value env(Json::objectValue);
     if (!sharingId.IsInvalid()) {
         sharingHeader = sharingId.Get();
         setenv(SZ_X_SHARING_HEADER, sharingHeader.c_str(), 1);
         if (!sharingSid.IsInvalid()) {
-            cookie += std::string(separator) + sharing::SZK_SHARING_SID + "=" + sharingSid.Get();
+            cookie += std::string(cookieCame ? "; " : "") + sharing::SZK_SHARING_SID + "=" + sharingSid.Get();
             setenv("HTTP_COOKIE", cookie.c_str(), 1);
         }
     }
     if (!sid.IsInvalid()) {
-        cookie += separator;
-        const std::size_t found = cookie.find("id=");
-        if (found != std::string::npos) {
-            cookie.replace(found, 2, "abandoned");
+        if (cookieCame) {
+            cookie += "; ";
+            const std::size_t found = cookie.find("id=");
+            if (found != std::string::npos) {
+                cookie.replace(found, 2, "abandoned");
+            }
         }
         cookie += "id=" + sid.Get();
         setenv("HTTP_COOKIE", cookie.c_str(), 1);

@@ -32,7 +32,9 @@ void AppendHeaderLine(std::string& block, const std::string& name, const Json::V
     }
 }
 
-void Write(const std::string& text) { fwrite(text.data(), 1, text.size(), stdout); }
+void Write(const std::string& text) {
+    fwrite(text.data(), 1, text.size(), stdout);
+}
 
 }  // namespace
 

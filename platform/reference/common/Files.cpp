@@ -95,7 +95,7 @@ bool ReplaceFile(const std::string& path, std::string_view content) {
         if (!file.IsOpen()) {
             return false;
         }
-        if (fchmod(file.Get(), 0600) != 0 || !WriteAll(file.Get(), content)) {
+        if (fchmod(file.Get(), 0600) != 0 || !WriteAll(file.Get(), content) || fsync(file.Get()) != 0) {
             unlink(fresh.c_str());
             return false;
         }

@@ -41,7 +41,7 @@ bool WriteAll(int descriptor, std::string_view content);
 
 /**
  * Makes or replaces a file with mode 0600: the content is written beside it and renamed, so that a reader sees the old
- * content or the new, never a part. Nothing is left beside it on failure.
+ * content or the new, never a part, after a loss of power too. Nothing is left beside it on failure.
  */
 bool ReplaceFile(const std::string& path, std::string_view content);
 

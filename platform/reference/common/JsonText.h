@@ -22,7 +22,7 @@ std::string WriteJson(const Json::Value& value);
 /** Reads and parses a file; `out` is left alone unless the result is kGood. */
 ReadResult ReadJson(const char* path, size_t limit, FileTrust trust, Json::Value& out);
 
-/** The member's text, or `fallback` if `value` is no object, lacks it, or holds something else there. */
+/** The text under `name`; `fallback` if `value` is no object, lacks it or holds something else there. */
 std::string JsonTextMember(const Json::Value& value, const char* name, const char* fallback = "");
 
 }  // namespace reference

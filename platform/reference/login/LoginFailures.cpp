@@ -6,8 +6,10 @@
 #include <syslog.h>
 #include <unistd.h>
 
+#include <cerrno>
 #include <cinttypes>
 #include <cstdio>
+#include <cstring>
 #include <ctime>
 
 #include "Paths.h"
@@ -22,6 +24,7 @@ namespace {
 constexpr size_t kLargestFile = 128;
 constexpr size_t kMostFiles = 20000;
 constexpr int kLockSeconds = 5;
+constexpr const char* kLockName = ".lock";
 
 /** Runs on while the machine sleeps, and no change of the clock shortens a block. */
 int64_t Now() {
@@ -31,7 +34,7 @@ int64_t Now() {
 }
 
 UniqueFd Lock() {
-    const std::string lock = std::string(paths::kLoginFailureDirectory) + "/.lock";
+    const std::string lock = std::string(paths::kLoginFailureDirectory) + "/" + kLockName;
     if (!EnsurePrivateDirectory(paths::kLoginFailureDirectory)) {
         syslog(LOG_ERR, "folder %s cannot be used", paths::kLoginFailureDirectory);
         return UniqueFd();
@@ -61,7 +64,8 @@ size_t Sweep() {
     size_t kept = 0;
     while (const struct dirent* entry = readdir(directory)) {
         struct stat status;
-        if (entry->d_name[0] == '.' || fstatat(dirfd(directory), entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0) {
+        if (strcmp(entry->d_name, kLockName) == 0 ||
+            fstatat(dirfd(directory), entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0 || !S_ISREG(status.st_mode)) {
             continue;
         }
         if (status.st_mtime >= oldest || unlinkat(dirfd(directory), entry->d_name, 0) != 0) {
@@ -142,7 +146,12 @@ LoginFailures::Result LoginFailures::Charge() const {
 
 bool LoginFailures::Succeed() const {
     const UniqueFd lock = Lock();
-    return lock.IsOpen() && unlink(accountFile.c_str()) == 0 && RefundFile(sourceFile);
+    if (!lock.IsOpen()) {
+        return false;
+    }
+    // Another login of the account at the same time may have removed it first.
+    const bool cleared = unlink(accountFile.c_str()) == 0 || errno == ENOENT;
+    return cleared && RefundFile(sourceFile);
 }
 
 bool LoginFailures::TakeBack() const {

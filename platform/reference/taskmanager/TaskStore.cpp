@@ -109,7 +109,7 @@ std::string WriteBeside(const UniqueFd& folder, const std::string& text, mode_t 
     if (text.size() > kLargestTaskRecord || !IsJsonText(text) || !FillRandom(random, sizeof(random))) {
         return "";
     }
-    const std::string name = ".new-" + HexText(std::string_view(random, sizeof(random)));
+    std::string name = ".new-" + HexText(std::string_view(random, sizeof(random)));
     const UniqueFd file(
         openat(folder.Get(), name.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_CLOEXEC | O_NOFOLLOW, kRecordMode));
     if (!file.IsOpen()) {

@@ -52,6 +52,10 @@ bool ReadIdentity(Identity& identity) {
 
 /** The groups that a login of the account would have, sorted. */
 bool ExpectedGroups(const reference::Account& account, std::vector<gid_t>& groups) {
+    if (account.name == reference::kSystemUser) {
+        groups.assign(1, account.gid);
+        return true;
+    }
     int count = 64;
     groups.resize(static_cast<size_t>(count));
     if (getgrouplist(account.name.c_str(), account.gid, groups.data(), &count) < 0) {
@@ -121,7 +125,9 @@ bool ResetCredentialsByName(const char* user, bool keep) {
         return false;
     }
     const bool isSystem = strcmp(user, reference::kSystemUser) == 0;
-    const auto account = reference::FindAccount(isSystem ? "root" : user);
+    // Root with root's group alone: the name stands for the device itself, so the user database has no say in it.
+    const auto account =
+        isSystem ? std::optional(reference::Account{0, 0, reference::kSystemUser, "/"}) : reference::FindAccount(user);
     if (!account) {
         errno = ENOENT;
         return false;

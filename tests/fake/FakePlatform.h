@@ -1,0 +1,172 @@
+#pragma once
+
+#include <json/value.h>
+
+#include <map>
+#include <set>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "FakeProcess.h"
+#include "ForkedChildren.h"
+
+namespace fake {
+
+/** One call that reached the fake, platform library or system. */
+struct Call {
+    std::string name;
+    std::string arguments;
+
+    std::string Text() const { return name + "(" + arguments + ")"; }
+};
+
+struct User {
+    uid_t uid = 0;
+    gid_t gid = 0;
+    std::vector<gid_t> groups;
+    bool admin = false;
+};
+
+/** A login session as the CGI library would judge it. */
+struct Session {
+    std::string user;
+    int result = 1;
+    unsigned int uid = 0;
+    /** Values by the number that `ZovaCgiGetOption` takes. */
+    std::map<int, std::string> options;
+};
+
+struct DeviceToken {
+    std::string user;
+    std::set<std::pair<std::string, std::string>> calls;
+};
+
+/** What `QLIBCProcFork` does: the code behind it runs as the parent, as the child, or sees a refusal. */
+enum class ForkAs { kParent, kChild, kRefused };
+
+/** How far `ResetCredentialsByName` gets before it fails. */
+enum class BreakCredentials { kNever, kAfterGroups, kAfterGroup };
+
+/**
+ * The closed libraries and the process's surroundings as plain data. One object is active at a time; it records every
+ * call, answers from its state, and fails on demand. A call that it does not model ends the test program.
+ */
+class FakePlatform {
+public:
+    FakePlatform();
+    FakePlatform(const FakePlatform&) = delete;
+    FakePlatform& operator=(const FakePlatform&) = delete;
+    ~FakePlatform();
+
+    /** The active object, null if there is none: system calls then pass through. */
+    static FakePlatform* Active();
+    /** The active object; ends the program if there is none. */
+    static FakePlatform& Required(const char* caller);
+
+    // ---- state ----
+
+    std::map<std::string, User> users;
+    std::map<std::string, Session> sessions;
+    std::map<std::string, DeviceToken> deviceTokens;
+    /** Result for a session id that is in nobody's list. */
+    int unknownSessionResult = -2;
+    std::string language = "enu";
+    int tokenEnable = 0;
+    /** Empty: the address cannot be worked out. */
+    std::string remoteAddress = "192.0.2.7";
+    int cgiTimeout = 15;
+    int cgiSkipCheckIP = 0;
+    std::string sessionDirectory = "/run/fake/sessions";
+    int systemTimeout = 20;
+    /** User, privilege, address. */
+    std::set<std::vector<std::string>> appPrivileges;
+    std::map<std::string, std::string> userPreferenceDirs;
+    std::map<std::string, std::string> groupPreferenceDirs;
+    bool confined = false;
+    BreakCredentials breakCredentials = BreakCredentials::kNever;
+    /** Files that `QLIBCFileExist`, `ReadJsonFile` and `glob` see, by path. */
+    std::map<std::string, std::string> files;
+    /** Content of key="value" files, by path. */
+    std::map<std::string, std::map<std::string, std::string>> keyValueFiles;
+    /** Lock files that somebody else holds. */
+    std::set<std::string> lockedFiles;
+    std::set<std::string> directories;
+    /** Path prefixes under which the framework's own file calls are led elsewhere. */
+    std::map<std::string, std::string> redirects;
+    ForkAs forkAs = ForkAs::kParent;
+    /** How many more times a forked child that asks finds its parent, a process of root, alive. */
+    int parentPolls = 0;
+    int serverRestarts = 0;
+    /** Seconds since the epoch; below 0: the real clock. */
+    long long clock = -1;
+    /** Enciphered text to clear text, for lines, envelopes and AES (there as key, NUL-free blank, cipher text). */
+    std::map<std::string, std::string> cipherLines;
+    std::map<std::string, std::string> cipherEnvelopes;
+    std::map<std::string, std::string> cipherAES;
+    /** Sharing links by hash. */
+    std::set<std::string> sharingEntries;
+    bool sharingDatabaseGood = true;
+
+    FakeProcess process;
+    ForkedChildren children;
+
+    // ---- calls ----
+
+    std::vector<Call> calls;
+
+    /**
+     * Notes a call. `error` is what a failure of it leaves in `errno`, 0 for a call that cannot fail.
+     * @return false if the call has to fail; `errno` is set then.
+     */
+    bool Enter(const char* name, const std::string& arguments, int error);
+
+    /** Texts of the calls with one of these names, in order. */
+    std::vector<std::string> CallsOf(const std::set<std::string>& names) const;
+    int CountOf(const std::string& name) const;
+
+    // ---- faults ----
+
+    /** Fails the `number`th call from now on that can fail, once. */
+    void FailCall(int number);
+    /** What `FailCall` made fail; empty if it has not come to that. */
+    std::string FailedCall() const { return failedCall; }
+    /** Position of the failed call in `calls`. */
+    std::size_t FailedIndex() const { return failedIndex; }
+    /** Fails the calls of this name, after letting `skip` pass, `times` times (below 0: always). */
+    void Fail(const std::string& name, int error, int skip = 0, int times = -1);
+    void StopFailing();
+
+    /** Where the framework's file calls are really led to. */
+    std::string Redirected(const std::string& path) const;
+
+private:
+    struct NamedFault {
+        int error;
+        int skip;
+        int times;
+    };
+
+    std::map<std::string, NamedFault> namedFaults;
+    int failNumber = 0;
+    int failableSeen = 0;
+    std::string failedCall;
+    std::size_t failedIndex = 0;
+};
+
+/** Takes the active object away for its scope, so that what the test program itself does is not recorded. */
+class [[nodiscard]] Suspended {
+public:
+    Suspended();
+    Suspended(const Suspended&) = delete;
+    Suspended& operator=(const Suspended&) = delete;
+    ~Suspended();
+
+private:
+    FakePlatform* platform;
+};
+
+/** Ends the test program: the fake does not model this. */
+[[noreturn]] void Unmodelled(const std::string& what);
+
+}  // namespace fake

@@ -1,0 +1,132 @@
+// The smaller closed libraries on the fake platform: sharing, tokens, ciphers, web server control.
+
+#include <cerrno>
+#include <cstring>
+
+#include "FakePlatform.h"
+#include "zovaaccesstoken.h"
+#include "zovacloudservice.h"
+#include "zovacredential.h"
+#include "zovasharing.h"
+#include "zovaw3.h"
+
+using fake::FakePlatform;
+
+extern "C" {
+
+const char* const SZ_X_SHARING_HEADER = "HTTP_X_FAKE_SHARING";
+
+int ZovaAccessTokenGrant(const std::string* tokenId, const char* api, const char* method, char* user, int userSize) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    if (!platform.Enter(__func__, *tokenId + ", " + api + ", " + method + ", " + std::to_string(userSize), EACCES)) {
+        return -1;
+    }
+    const auto found = platform.deviceTokens.find(*tokenId);
+    if (found == platform.deviceTokens.end() || found->second.calls.count({api, method}) == 0) {
+        return -1;
+    }
+    strncpy(user, found->second.user.c_str(), static_cast<std::size_t>(userSize) - 1);
+    return 0;
+}
+
+int ZOVACloudServiceZntokenGenerateToken(const char* token, char* out, int size) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    if (!platform.Enter(__func__, std::string(token) + ", " + std::to_string(size), EIO)) {
+        return -1;
+    }
+    const std::string key = std::string("key of ") + token;
+    strncpy(out, key.c_str(), static_cast<std::size_t>(size) - 1);
+    return 0;
+}
+
+}  // extern "C"
+
+namespace ZOVA {
+
+bool CredRequestUtil::GetDecryptAESString(const std::string& key, const std::string& cipherText, std::string& plain) {
+    FakePlatform& platform = FakePlatform::Required("GetDecryptAESString");
+    const auto found = platform.cipherAES.find(key + " " + cipherText);
+    if (!platform.Enter("GetDecryptAESString", key + ", " + cipherText, EINVAL) || found == platform.cipherAES.end()) {
+        return false;
+    }
+    plain = found->second;
+    return true;
+}
+
+namespace sharing {
+
+const char* const SZK_SHARING_SID = "sharing_sid";
+
+namespace db {
+
+BaseDB::~BaseDB() = default;
+
+bool BaseDB::IsGood() const {
+    FakePlatform& platform = FakePlatform::Required("SharingDB::IsGood");
+    return platform.Enter("SharingDB::IsGood", "", EIO) && platform.sharingDatabaseGood;
+}
+
+SharingDB& SharingDB::Instance() {
+    static SharingDB database;
+    FakePlatform::Required("SharingDB::Instance").Enter("SharingDB::Instance", "", 0);
+    return database;
+}
+
+EntryDB::EntryDB(BaseDB& base) : database(base) {}
+
+bool EntryDB::GetByHash(const std::string& hash, record::Entry& out) const {
+    FakePlatform& platform = FakePlatform::Required("EntryDB::GetByHash");
+    if (!platform.Enter("EntryDB::GetByHash", hash, EIO) || platform.sharingEntries.count(hash) == 0) {
+        return false;
+    }
+    out.hash = hash;
+    return true;
+}
+
+SessionDB::SessionDB(BaseDB& base) : database(base) {}
+
+bool SessionDB::GetBySessionId(const std::string& sid, record::Session& out) const {
+    if (!FakePlatform::Required("SessionDB::GetBySessionId").Enter("SessionDB::GetBySessionId", sid, EIO)) {
+        return false;
+    }
+    out.id = sid;
+    return true;
+}
+
+TokenDB::TokenDB(BaseDB& base) : database(base) {}
+
+bool TokenDB::GetBySessionEntry(const record::Session& session, const record::Entry& entry, record::Token& out) const {
+    if (!FakePlatform::Required("TokenDB::GetBySessionEntry")
+             .Enter("TokenDB::GetBySessionEntry", session.id + ", " + entry.hash, EIO)) {
+        return false;
+    }
+    out.id = session.id + " of " + entry.hash;
+    return true;
+}
+
+}  // namespace db
+}  // namespace sharing
+}  // namespace ZOVA
+
+namespace zovaw3 {
+
+class Engine::Private {};
+
+std::shared_ptr<Engine::Private> Engine::CreatePrivate() {
+    return std::make_shared<Private>();
+}
+
+ZELM::ZELM(std::shared_ptr<Engine::Private> shared) : engine(std::move(shared)) {}
+
+ZELM::~ZELM() = default;
+
+bool ZELM::RestartService() {
+    FakePlatform& platform = FakePlatform::Required("RestartService");
+    if (!platform.Enter("RestartService", engine == nullptr ? "no engine" : "", EIO)) {
+        return false;
+    }
+    ++platform.serverRestarts;
+    return true;
+}
+
+}  // namespace zovaw3

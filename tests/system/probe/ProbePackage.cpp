@@ -1,0 +1,82 @@
+// A package whose methods tell in which state of the process they run, and then leave it as badly as they can.
+
+#include <webapi/APIRequest.h>
+#include <webapi/APIResponse.h>
+#include <webapi/APITable.h>
+
+#include <signal.h>
+
+#include <iostream>
+#include <stdexcept>
+
+#include "ProcessState.h"
+
+namespace {
+
+void Tell(ZOVA::APIRequest*, ZOVA::APIResponse* response) {
+    Json::Value state = probe::ProcessState();
+    state["input_at_end"] = std::cin.get() == std::char_traits<char>::eof();
+    std::cout << "this text has nowhere to go" << std::flush;
+    response->SetSuccess(state);
+    // What a careless method leaves behind.
+    if (chdir("/") != 0 || setpriority(PRIO_PROCESS, 0, 7) != 0) {
+        response->SetError(1001, Json::Value());
+    }
+}
+
+void Wait(ZOVA::APIRequest*, ZOVA::APIResponse* response) {
+    usleep(500000);
+    response->SetSuccess(Json::Value());
+}
+
+void Die(ZOVA::APIRequest*, ZOVA::APIResponse*) {
+    kill(getpid(), SIGKILL);
+}
+
+void Throw(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
+    Tell(request, response);
+    throw std::runtime_error("on purpose");
+}
+
+bool RefuseWithAnError(ZOVA::APIRequest*, ZOVA::APIResponse* response) {
+    response->SetError(1002, Json::Value());
+    return false;
+}
+
+bool ThrowInACheck(ZOVA::APIRequest*, ZOVA::APIResponse*) {
+    throw 1;
+}
+
+constexpr const char* kAPI = "ZOVA.Test.Probe";
+
+const ZOVA::_tag_API_TABLE kTable[] = {
+    {kAPI, 1, "granted", Tell},
+    {kAPI, 1, "by_user", Tell},
+    {kAPI, 1, "by_default", Tell},
+    {kAPI, 1, "lasting", Tell},
+    {kAPI, 1, "by_user_lasting", Tell},
+    {kAPI, 1, "api_user", Tell},
+    {kAPI, 1, "unknown_user", Tell},
+    {kAPI, 1, "throws", Throw},
+    {kAPI, 1, "refused", Tell},
+    {kAPI, 1, "check_throws", Tell},
+    {kAPI, 1, "wait", Wait},
+    {kAPI, 1, "dies", Die},
+    {nullptr, 0, nullptr, nullptr},
+};
+
+const ZOVA::_tag_API_CHECK_TABLE kChecks[] = {
+    {kAPI, 1, "refused", RefuseWithAnError, nullptr, nullptr},
+    {kAPI, 1, "check_throws", ThrowInACheck, nullptr, nullptr},
+    {nullptr, 0, nullptr, nullptr, nullptr, nullptr},
+};
+
+}  // namespace
+
+WEBAPI_LIBRARY_EXPORT const ZOVA::_tag_API_TABLE* GetAPITable() {
+    return kTable;
+}
+
+WEBAPI_LIBRARY_EXPORT const ZOVA::_tag_API_CHECK_TABLE* GetAPICheckTable() {
+    return kChecks;
+}

@@ -1,0 +1,5 @@
+// A library that forgot its table.
+
+extern "C" __attribute__((visibility("default"))) int SomethingElse() {
+    return 1;
+}
