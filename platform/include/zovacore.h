@@ -8,6 +8,11 @@ extern "C" {
 int QLIBCFileExist(const char* path);
 /** Not 0 if the key="value" file holds the pair; `unused` is 0. */
 int QLIBCFileCheckKeyValue(const char* path, const char* key, const char* value, int unused);
+/**
+ * Sets the key in the device's information file, /etc/zovainfo.conf. The file is replaced as a whole and under a lock;
+ * comments and order stay. Negative on failure, with the file left as it was.
+ */
+int QLIBCINFOSetKeyValue(const char* key, const char* value);
 /** Creates the file if needed and sets its times to now; negative on failure. */
 int QLIBCFileTouch(const char* path);
 /** Sets the file's times to now (with 1, 0); negative on failure. */

@@ -2,6 +2,7 @@
 
 // libzovaw3.so.6: control of the web server.
 
+#include <cstdint>
 #include <memory>
 
 namespace zovaw3 {
@@ -19,6 +20,8 @@ public:
     ~ZELM();
     /** Restarts the web server's service; false on failure. */
     bool RestartService();
+    /** The port at which the web server takes HTTPS on this device. */
+    std::uint16_t GetHttpsPort();
 
 private:
     std::shared_ptr<Engine::Private> engine;

@@ -18,6 +18,7 @@
 #include "zovacore.h"
 #include "zovacredential.h"
 #include "zovacredentials.h"
+#include "zovadaemon.h"
 #include "zovalogin.h"
 #include "zovasdk.h"
 #include "zovasharing.h"
