@@ -76,7 +76,9 @@ class ServeCase(unittest.TestCase):
 
     def start(self, port, environment=None, device=None):
         """A running ./serve and what it printed, once it says that it can be stopped."""
-        process = subprocess.Popen(self.command("--port", str(port), device=device), stdout=subprocess.PIPE,
+        # A shell cannot catch a signal that it was started with as ignored, as under nohup or in a job of a script.
+        command = ["env", "--default-signal=HUP,INT,TERM", *self.command("--port", str(port), device=device)]
+        process = subprocess.Popen(command, stdout=subprocess.PIPE,
                                    stderr=subprocess.STDOUT, stdin=subprocess.DEVNULL, text=True,
                                    env={**os.environ, **(environment or {})})
         self.addCleanup(self.end, process)
