@@ -34,18 +34,24 @@ ENVIRONMENT = {
 
 
 class Call:
-    """One process: its program, the path under which the web server offers it, and what the client sends."""
+    """One process: its program, the path under which the web server offers it, what the client sends, and the answer
+    that has to come; None for one that is another each time."""
 
-    def __init__(self, program, query, cookie=None):
+    def __init__(self, program, query, cookie=None, form="", expected=EXPECTED):
         self.program = program
         self.query = query
         self.cookie = cookie
+        self.form = form.encode()
+        self.expected = expected
 
     def environment(self):
         environment = dict(ENVIRONMENT, QUERY_STRING=self.query, SCRIPT_FILENAME=self.program,
                            SCRIPT_NAME=self.path(), REQUEST_URI=self.url())
         if self.cookie:
             environment["HTTP_COOKIE"] = self.cookie
+        if self.form:
+            environment.update(REQUEST_METHOD="POST", CONTENT_TYPE="application/x-www-form-urlencoded",
+                               CONTENT_LENGTH=str(len(self.form)))
         return environment
 
     def path(self):
@@ -57,21 +63,32 @@ class Call:
     def run(self, tool=()):
         """Runs the process under the tool and gives what it wrote."""
         done = subprocess.run([*tool, self.program], cwd=os.path.dirname(self.program), env=self.environment(),
-                              stdin=subprocess.DEVNULL, stdout=subprocess.PIPE, stderr=subprocess.PIPE, check=False)
+                              input=self.form, stdout=subprocess.PIPE, stderr=subprocess.PIPE, check=False)
         if done.returncode != 0:
             raise RuntimeError(f"{self.program} ended with {done.returncode}: {done.stderr.decode()}")
         return done.stdout
 
     def check(self):
-        """Ends the measurement unless the process gives the answer that all of them have to give."""
-        output = self.run()
+        """Ends the measurement unless the process gives the right answer."""
+        self.check_output(self.run())
+
+    def check_output(self, output):
         body = output.partition(b"\r\n\r\n")[2]
-        if json.loads(body) != EXPECTED:
+        if json.loads(body) != self.expected:
             raise RuntimeError(f"{self.program} answered {output.decode()}")
 
+    def expected_text(self):
+        """The body of the right answer as all programs write it: compact, members sorted."""
+        return json.dumps(self.expected, sort_keys=True, separators=(",", ":"))
 
-def front(api, cookie=None):
-    return Call(HOST_FOLDER + "/front.cgi", f"api={api}&version=1&method=hello&name=world", cookie)
+
+def front(api, method, parameters, cookie=None, expected=EXPECTED):
+    pairs = {"api": api, "version": 1, "method": method, **parameters}
+    return Call(HOST_FOLDER + "/front.cgi", urllib.parse.urlencode(pairs), cookie, expected=expected)
+
+
+def session_cookie(session):
+    return "id=" + session
 
 
 def calls(session):
@@ -81,14 +98,13 @@ def calls(session):
     return {
         "bare C": Call(PROGRAM_FOLDER + "/bare_c_cgi", ""),
         "bare C++": Call(PROGRAM_FOLDER + "/bare_cpp_cgi", urllib.parse.quote(query)),
-        "front, open": front("ZOVA.Bench.Small"),
-        "front, session": front("ZOVA.Bench.Login", "id=" + session),
+        "front, open": front("ZOVA.Bench.Small", "hello", {"name": "world"}),
+        "front, session": front("ZOVA.Bench.Login", "hello", {"name": "world"}, session_cookie(session)),
     }
 
 
 def login_call(account, password):
-    pairs = {"api": "ZOVA.Core.Session", "version": 1, "method": "login", "account": account, "passwd": password}
-    return Call(HOST_FOLDER + "/front.cgi", urllib.parse.urlencode(pairs))
+    return front("ZOVA.Core.Session", "login", {"account": account, "passwd": password}, expected=None)
 
 
 def log_in(url, account, password):

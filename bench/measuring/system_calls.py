@@ -36,15 +36,25 @@ def mapped_libraries(calls, login):
     return found
 
 
+def count(call):
+    """By name of the system call: how many the process and its children make."""
+    by_name = {}
+    for line in trace(call).splitlines():
+        found = re.match(r"\d+ +(\w+)\(", line)
+        if found:
+            by_name[found[1]] = by_name.get(found[1], 0) + 1
+    return by_name
+
+
+def total(call):
+    return sum(count(call).values())
+
+
 def counts(calls):
     """By call: the number of system calls, all together and by name."""
     table = {}
     for name, call in calls.items():
-        by_name = {}
-        for line in trace(call).splitlines():
-            found = re.match(r"\d+ +(\w+)\(", line)
-            if found:
-                by_name[found[1]] = by_name.get(found[1], 0) + 1
+        by_name = count(call)
         table[name] = {"total": sum(by_name.values()), "by name": by_name}
         most = sorted(by_name.items(), key=lambda item: -item[1])[:6]
         frequent = ", ".join(f"{call_name} {count}" for call_name, count in most)
