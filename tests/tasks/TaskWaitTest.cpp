@@ -2,6 +2,10 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <filesystem>
+#include <fstream>
+#include <string>
+
 #include "TaskDevice.h"
 #include "taskmanager.h"
 #include "webapi/Json.h"
@@ -147,4 +151,63 @@ TEST_F(TaskWaitTest, EndsTheWaitWhenTheRecordGoes) {
     EXPECT_LT(SecondsOf([&] { EXPECT_FALSE(task.waitForDataReady("task_run", 60)); }), 20);
     EXPECT_FALSE(task.hasProperty("info"));
     waitpid(child, nullptr, 0);
+}
+
+// ---- what a wait leaves behind ----
+
+namespace {
+
+/** Queues of file events that this process holds. */
+int CountFileEvents() {
+    int count = 0;
+    for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) {
+        std::error_code gone;
+        count += std::filesystem::read_symlink(entry, gone) == "anon_inode:inotify" ? 1 : 0;
+    }
+    return count;
+}
+
+/** Watches set on it, as the kernel tells them. */
+int CountWatches() {
+    int count = 0;
+    for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fdinfo")) {
+        std::ifstream info(entry.path());
+        for (std::string line; std::getline(info, line);) {
+            count += line.rfind("inotify ", 0) == 0 ? 1 : 0;
+        }
+    }
+    return count;
+}
+
+}  // namespace
+
+TEST_F(TaskWaitTest, ManyWaitsUseOneQueueAndLeaveNoWatch) {
+    for (const char* id : {"1", "2", "3", "4"}) {
+        ASSERT_TRUE(MakeRecord("alice", id));
+        EXPECT_FALSE(Task("alice", id).waitForDataReady("none", 0));
+    }
+    EXPECT_EQ(CountFileEvents(), 1);
+    EXPECT_EQ(CountWatches(), 0);
+}
+
+TEST_F(TaskWaitTest, AForkedProcessWaitsWithAQueueOfItsOwn) {
+    ASSERT_TRUE(MakeRecord("alice", "1"));
+    EXPECT_FALSE(Task("alice", "1").waitForDataReady("none", 0));
+    const pid_t child = fork();
+    if (child == 0) {
+        // The parent's queue stays as it is, whatever the child does.
+        Task("alice", "1").waitForDataReady("none", 0);
+        _exit(CountFileEvents() == 1 ? 0 : 1);
+    }
+    int status = -1;
+    ASSERT_EQ(waitpid(child, &status, 0), child);
+    EXPECT_EQ(status, 0);
+    const pid_t writer = fork();
+    if (writer == 0) {
+        usleep(50'000);
+        Task("alice", "1").setProperty("late", true);
+        _exit(0);
+    }
+    EXPECT_LT(SecondsOf([] { EXPECT_TRUE(Task("alice", "1").waitForDataReady("late", 60)); }), 30);
+    ASSERT_EQ(waitpid(writer, nullptr, 0), writer);
 }

@@ -2,6 +2,7 @@
 
 #include <poll.h>
 #include <sys/inotify.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cerrno>
@@ -22,29 +23,54 @@ long MonotonicMilliseconds() {
     return now.tv_sec * 1000 + now.tv_nsec / 1000000;
 }
 
+/**
+ * The process's own queue of file events, made at the first wait and never closed: the kernel takes some 15
+ * milliseconds to close one, which would be added to each answer that waits for a task. -1 if there can be none.
+ */
+int FileEvents() {
+    static int descriptor = -1;
+    static pid_t maker = 0;
+    if (maker != getpid()) {
+        // A queue that came with a fork would share its events with the parent's.
+        const UniqueFd inherited(maker != 0 ? descriptor : -1);
+        maker = getpid();
+        descriptor = inotify_init1(IN_CLOEXEC | IN_NONBLOCK);
+    }
+    return descriptor;
+}
+
 /** Tells when the file of a record is replaced or removed. */
 class RecordWatch {
 public:
-    RecordWatch() : notify(inotify_init1(IN_CLOEXEC | IN_NONBLOCK)) {}
+    RecordWatch() : notify(FileEvents()) {}
+    RecordWatch(const RecordWatch&) = delete;
+    RecordWatch& operator=(const RecordWatch&) = delete;
+    ~RecordWatch() {
+        if (watch >= 0) {
+            inotify_rm_watch(notify, watch);
+        }
+        Drain();
+    }
 
     /** Watches the file that bears the record's name now. What happens to it from here on is not missed. */
     void Renew(const TaskKey& key) {
-        // The folder itself cannot be watched by who may not list it. A file that is replaced loses its last name.
+        // The folder itself cannot be watched by who may not list it. A file that is replaced loses its last name, and
+        // its watch with it.
         constexpr unsigned int kEvents = IN_ATTRIB | IN_DELETE_SELF | IN_MOVE_SELF | IN_DONT_FOLLOW;
-        watching = notify.IsOpen() && inotify_add_watch(notify.Get(), TaskStore::PathOf(key).c_str(), kEvents) >= 0;
+        watch = notify >= 0 ? inotify_add_watch(notify, TaskStore::PathOf(key).c_str(), kEvents) : -1;
     }
 
     void Drain() const {
         char events[4096];
-        while (notify.IsOpen() && read(notify.Get(), events, sizeof(events)) > 0) {
+        while (notify >= 0 && read(notify, events, sizeof(events)) > 0) {
         }
     }
 
-    int Descriptor() const { return watching ? notify.Get() : -1; }
+    int Descriptor() const { return watch >= 0 ? notify : -1; }
 
 private:
-    UniqueFd notify;
-    bool watching = false;
+    int notify;
+    int watch = -1;
 };
 
 /** Tells when the process of a record ends. */
