@@ -11,6 +11,9 @@ import device
 import probe
 
 PROGRAM = probe.BUILD + "/bin/probe-exec"
+# Descriptors to which the method's output may go.
+NOWHERE = -1
+OWN = 1
 CAPTURED = 4
 HEADER = b"Content-Type: text/plain\r\n\r\n"
 # What a pump that looks for ends of texts or headers stumbles over.
@@ -31,14 +34,15 @@ class Outcome:
 
 
 class OutOfBand(probe.ProbeTestCase):
-    def call(self, method, form="param", capture=False, caller="root", user="alice", api=probe.API, version=1, **params):
+    def call(self, method, form="param", target=NOWHERE, redirections="", caller="root", user="alice", api=probe.API,
+             version=1, **params):
         """One call by a program of its own, whose process comes out of it as it went in."""
         call = {"user": user, "api": api, "version": version, "method": method, "params": params}
         with tempfile.TemporaryDirectory() as folder:
             os.chmod(folder, 0o777)
             process = subprocess.run(
-                ["/bin/sh", "-c", f'exec "$0" "$@" 3>report {CAPTURED}>captured', PROGRAM, form,
-                 str(CAPTURED if capture else -1), json.dumps(call)], env={}, cwd=folder, stdin=subprocess.DEVNULL,
+                ["/bin/sh", "-c", f'exec "$0" "$@" 3>report {CAPTURED}>captured {redirections}', PROGRAM, form,
+                 str(target), json.dumps(call)], env={}, cwd=folder, stdin=subprocess.DEVNULL,
                 capture_output=True, timeout=device.TIME_LIMIT, check=False, user=caller, group=caller, extra_groups=[])
             self.assertEqual((b"", 0), (process.stderr, process.returncode))
             with open(folder + "/report", encoding="utf-8") as file:
@@ -66,9 +70,9 @@ class OutOfBand(probe.ProbeTestCase):
         rows = {"by_user": ([0, uid, 0], [0, gid, 0]), "by_user_lasting": ([uid] * 3, [gid] * 3)}
         for method, ids in rows.items():
             for form in ("param", "short"):
-                for capture in (False, True):
-                    with self.subTest(method=method, form=form, capture=capture):
-                        outcome = self.call(method, form, capture)
+                for target in (NOWHERE, CAPTURED):
+                    with self.subTest(method=method, form=form, target=target):
+                        outcome = self.call(method, form, target)
                         inside = outcome.result["data"]
                         self.assertEqual((*ids, groups), (inside["user"], inside["group"], inside["groups"]))
                         self.assertIs(True, inside["input_at_end"])
@@ -86,7 +90,7 @@ class OutOfBand(probe.ProbeTestCase):
             for method in ("write", "write_lasting"):
                 for form in ("param", "short"):
                     with self.subTest(times=times, method=method, form=form):
-                        outcome = self.call(method, form, capture=True, text=TEXT, times=times)
+                        outcome = self.call(method, form, target=CAPTURED, text=TEXT, times=times)
                         self.assertEqual(0, outcome.code)
                         self.assertEqual(TEXT.encode() * times, outcome.captured)
                         self.assertEqual(b"", outcome.output)
@@ -98,19 +102,42 @@ class OutOfBand(probe.ProbeTestCase):
                 outcome = self.call(method, text=TEXT, times=3)
                 self.assertEqual((0, output, b""), (outcome.code, outcome.output, outcome.captured))
 
+    def test_captured_output_can_go_to_the_programs_own(self):
+        outcome = self.call("write", target=OWN, text=TEXT, times=100000)
+        self.assertEqual((0, b""), (outcome.code, outcome.captured))
+        self.assertEqual(TEXT.encode() * 100000, outcome.output)
+
+    def test_a_target_that_takes_nothing_costs_the_call_nothing(self):
+        # One that is not open, and one that is open for reading only.
+        for target, redirection in ((77, ""), (CAPTURED, f"{CAPTURED}</dev/null")):
+            with self.subTest(target):
+                outcome = self.call("write", target=target, redirections=redirection, text=TEXT, times=100000)
+                self.assertEqual((0, b"", b""), (outcome.code, outcome.output, outcome.captured))
+
+    def test_a_program_without_standard_descriptors_makes_the_same_calls(self):
+        closed = "<&- >&- 2>&-"
+        for method in ("write", "write_lasting"):
+            with self.subTest(method):
+                outcome = self.call(method, target=CAPTURED, redirections=closed, text=TEXT, times=100000)
+                self.assertEqual((0, TEXT.encode() * 100000), (outcome.code, outcome.captured))
+        uid = pwd.getpwnam("alice").pw_uid
+        for method, ids in (("by_user", [0, uid, 0]), ("by_user_lasting", [uid] * 3)):
+            with self.subTest(method):
+                self.assertEqual(ids, self.call(method, redirections=closed).result["data"]["user"])
+
     def test_a_method_that_dies_answers_117_and_what_it_wrote_has_arrived(self):
         failure = {"success": False, "error": {"code": 117}}
         self.assertEqual(failure, self.call("dies").result)
-        outcome = self.call("write_lasting", capture=True, text=TEXT, times=50000, dies=True)
+        outcome = self.call("write_lasting", target=CAPTURED, text=TEXT, times=50000, dies=True)
         self.assertEqual(failure, outcome.result)
         self.assertEqual(TEXT.encode() * 50000, outcome.captured)
 
     def test_a_result_from_a_child_that_no_pipe_holds_answers_117(self):
         self.assertEqual(60000, len(self.call("answer_long", size=60000).result["data"]))
         for size in (70000, 10000000):
-            for capture in (False, True):
-                with self.subTest(size=size, capture=capture):
-                    self.assertEqual(117, self.call("answer_long", capture=capture, size=size).code)
+            for target in (NOWHERE, CAPTURED):
+                with self.subTest(size=size, target=target):
+                    self.assertEqual(117, self.call("answer_long", target=target, size=size).code)
 
     def test_what_cannot_be_called_is_an_error_of_its_own(self):
         rows = {
@@ -129,9 +156,9 @@ class OutOfBand(probe.ProbeTestCase):
             "a method that throws": (117, {"method": "throws"}),
         }
         for name, (code, call) in rows.items():
-            for capture in (False, True):
-                with self.subTest(name, capture=capture):
-                    outcome = self.call(capture=capture, **call)
+            for target in (NOWHERE, CAPTURED):
+                with self.subTest(name, target=target):
+                    outcome = self.call(target=target, **call)
                     self.assertEqual((code, b"", b""), (outcome.code, outcome.output, outcome.captured))
 
     def test_a_program_that_is_not_root_cannot_take_an_identity(self):
