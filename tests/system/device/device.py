@@ -1,14 +1,17 @@
 """The device as the tests see it: its places, its files, and the base class of all test cases inside it."""
 
 import os
+import time
 import unittest
 
 HOST = "/usr/zova/zovaman/webapi/front.cgi"
 FOLDER = os.path.dirname(HOST)
 SESSIONS = "/run/zova/sessions"
 FAILURES = "/run/zova/login-failures"
+TASKS = "/run/zova/tasks"
 LOGS = "/var/log/zova"
 HOST_LOG = LOGS + "/host-error.log"
+SYSTEM_LOG = LOGS + "/messages"
 
 # Far above what any call takes, also under the sanitizers; a process still running then does not end by itself.
 TIME_LIMIT = 60
@@ -42,18 +45,73 @@ def watched_files():
     return found
 
 
-def hosts_running():
-    """Process numbers of the host programs that are under way."""
-    running = []
-    for entry in os.listdir("/proc"):
-        if not entry.isdigit():
-            continue
+def processes():
+    return [int(entry) for entry in os.listdir("/proc") if entry.isdigit()]
+
+
+def running(program):
+    """Process numbers of what runs this program."""
+    found = []
+    for process in processes():
         try:
-            if os.readlink(f"/proc/{entry}/exe") == HOST:
-                running.append(int(entry))
+            if os.readlink(f"/proc/{process}/exe") == program:
+                found.append(process)
         except OSError:
             continue  # ended meanwhile, or a thread of the kernel
-    return running
+    return found
+
+
+def hosts_running():
+    """Process numbers of the host programs that are under way."""
+    return running(HOST)
+
+
+def process_fields(process):
+    """The fields of /proc/<process>/stat behind the name: state first, the time of its start at 19. Empty if it is
+    gone."""
+    try:
+        with open(f"/proc/{process}/stat", encoding="utf-8", errors="replace") as file:
+            return file.read().rpartition(") ")[2].split()
+    except OSError:
+        return []
+
+
+def zombies():
+    """Process numbers of what has ended and was not waited for."""
+    return [process for process in processes() if process_fields(process)[:1] == ["Z"]]
+
+
+def remove_tasks(but=None):
+    """All records of tasks but the one in that file, as a restart of the device would do."""
+    for entry in list(os.scandir(TASKS)):
+        if entry.path != but:
+            os.rmdir(entry.path) if entry.is_dir(follow_symlinks=False) else os.unlink(entry.path)
+
+
+def wait_for(condition, what):
+    """Until the condition's value counts as true, which is returned. Fails when the time is over."""
+    limit = time.monotonic() + TIME_LIMIT
+    while not (value := condition()):
+        if time.monotonic() > limit:
+            raise AssertionError(f"in vain: {what}")
+        time.sleep(0.02)
+    return value
+
+
+class SystemLog:
+    """What the services write to the device's log from here on."""
+
+    def __init__(self):
+        self.size = os.path.getsize(SYSTEM_LOG)
+
+    def lines(self):
+        with open(SYSTEM_LOG, "rb") as log:
+            log.seek(self.size)
+            return log.read().decode("utf-8", "replace").splitlines()
+
+    def wait_for(self, text):
+        """Until a line holds the text: the service writes in its own time, but in order."""
+        wait_for(lambda: any(text in line for line in self.lines()), f"{text} in the log")
 
 
 class DeviceTestCase(unittest.TestCase):

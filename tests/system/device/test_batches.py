@@ -15,6 +15,14 @@ def entry(method, api=probe.API, version=1, **parameters):
     return {"api": api, "version": version, "method": method, **parameters}
 
 
+def batches(depth):
+    """A call inside this many batches of one entry each."""
+    innermost = GET_USER
+    for _ in range(depth):
+        innermost = entry("request", "ZOVA.Entry.Request", compound=[innermost])
+    return innermost
+
+
 GET_USER = entry("get", "ZOVA.Core.User")
 GET_INFO = entry("info", "ZOVA.Core.System")
 
@@ -109,6 +117,41 @@ class Batches(probe.ProbeTestCase):
             with self.subTest(text[:10]):
                 self.assertEqual(110, self.alice.call("ZOVA.Entry.Request", "request", post=True, compound=text).code())
         self.assertEqual(110, self.alice.call("ZOVA.Entry.Request", "request", post=True).code())
+
+    def test_batches_inside_batches_are_answered_to_the_depth_that_can_be_read(self):
+        result, has_fail = self.batch([batches(127), GET_USER])
+        self.assertFalse(has_fail)
+        self.assertEqual("alice", result[1]["data"]["name"])
+        row = result[0]
+        for _ in range(127):
+            row = row["data"]["result"][0]
+        self.assertEqual("alice", row["data"]["name"])
+        for depth in (128, 300):
+            with self.subTest(depth):
+                self.assertEqual(110, self.answer([batches(depth), GET_USER]).code())
+
+    def test_an_answer_from_a_child_that_is_nested_too_deep_to_be_read_is_lost_alone(self):
+        result, has_fail = self.batch([batches(127), GET_USER], mode="parallel")
+        self.assertFalse(has_fail)
+        self.assertEqual(entry("request", "ZOVA.Entry.Request"), result[0])
+        self.assertEqual("alice", result[1]["data"]["name"])
+
+    def test_one_entry_of_a_thousand_levels_refuses_the_batch(self):
+        for deep in ("[" * 1000 + "]" * 1000, '{"a":' * 1000 + "1" + "}" * 1000):
+            with self.subTest(deep[:5]):
+                text = json.dumps([GET_USER])[:-1] + "," + deep + "]"
+                self.assertEqual(110, self.alice.call("ZOVA.Entry.Request", "request", post=True, compound=text).code())
+
+    def test_a_batch_that_names_the_one_around_it_gets_nothing_of_it(self):
+        inner = [entry("request", "ZOVA.Entry.Request", **parameters) for parameters in (
+            {}, {"compound": "compound"}, {"compound": {"$ref": "#"}}, {"compound": "[]"}, {"compound": 0},
+            {"compound": None})]
+        for mode in ("sequential", "parallel"):
+            with self.subTest(mode):
+                result, has_fail = self.batch([*inner, GET_USER], mode=mode)
+                self.assertTrue(has_fail)
+                self.assertEqual([110] * 6, [row["error"]["code"] for row in result[:6]])
+                self.assertEqual("alice", result[6]["data"]["name"])
 
     def test_ten_thousand_entries_are_answered_one_by_one(self):
         # Of a method that gives its identity back, so that none of them costs a process.

@@ -30,6 +30,10 @@ class Tasks(device.DeviceTestCase):
         with open(TREE + "/large.bin", "wb") as file:
             file.truncate(LARGE)
 
+    def setUp(self):
+        super().setUp()
+        self.addCleanup(device.remove_tasks)
+
     def start(self, folder, **parameters):
         answer = self.alice.call(SEARCH, "start", folder=webclient.quoted(folder), **parameters).json()
         self.assertTrue(answer["success"], answer)
@@ -48,8 +52,9 @@ class Tasks(device.DeviceTestCase):
 
     @staticmethod
     def files():
-        # Each call renews the idle time of its session.
-        return {entry for entry in device.watched_files() if not entry[0].startswith(device.SESSIONS)}
+        # Each call renews the idle time of its session, and one in half a minute looks after the store.
+        renewed = (device.SESSIONS, device.TASKS + ".swept")
+        return {entry for entry in device.watched_files() if not entry[0].startswith(renewed)}
 
     def process_of_the_only_task(self):
         # The processes of earlier calls and stopped tasks end by themselves.
@@ -90,13 +95,24 @@ class Tasks(device.DeviceTestCase):
         self.assertTrue(self.status(task).json()["data"]["finish"])
 
     def test_ids_that_name_nothing_are_errors_of_their_own(self):
-        rows = {"alice/../../etc/passwd": 508, "alice/none": 508, "alice/": 508, "none": 503, "/x": 503, "root/1": 503,
-                "alice/a\nb": 508, "alice/a\0b": 508, "alice/" + "x" * 5000: 508, "@administrators/x": 503}
+        # What "status" and "stop" answer.
+        rows = {"alice/../../etc/passwd": (508, 508), "alice/none": (508, 508), "alice/": (508, 508),
+                "none": (503, 502), "/x": (503, 503), "root/1": (503, 503), "alice/a\nb": (508, 508),
+                "alice/a\0b": (508, 508), "alice/" + "x" * 5000: (508, 508), "@administrators/x": (503, 503),
+                "alice/a/../b": (508, 508), "../alice/x": (503, 503), "alice\0/x": (503, 503)}
         before = self.files()
-        for task, code in rows.items():
+        for task, codes in rows.items():
             with self.subTest(task[:20]):
-                self.assertEqual(code, self.status(task).code())
+                stopped = self.alice.call(TASK, "stop", task_id=webclient.quoted(task))
+                self.assertEqual(codes, (self.status(task).code(), stopped.code()))
         self.assertEqual(before, self.files())
+
+    def test_prefixes_that_fit_nothing_list_nothing(self):
+        self.start_a_long_one()
+        for prefix in ("../", "/", "search-\0", "search-\n", "x" * 5000, ".", "*", "search-?"):
+            with self.subTest(prefix[:20]):
+                answer = self.alice.call(TASK, "list", prefix=webclient.quoted(prefix)).json()
+                self.assertEqual({"user": None}, answer["data"])
 
 
 if __name__ == "__main__":

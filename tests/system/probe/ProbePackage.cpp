@@ -1,8 +1,10 @@
 // A package whose methods tell in which state of the process they run, and then leave it as badly as they can.
 
+#include <webapi/APIPolling.h>
 #include <webapi/APIRequest.h>
 #include <webapi/APIResponse.h>
 #include <webapi/APITable.h>
+#include <webapi/Json.h>
 
 #include <signal.h>
 
@@ -38,6 +40,56 @@ void Throw(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
     throw std::runtime_error("on purpose");
 }
 
+/** Writes a header, then "text" as often as "times" says, to descriptor 1, and dies if "dies" is true. */
+void Write(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
+    const std::string text = Json::asString(request->GetParam("text", ""));
+    std::string all = "Content-Type: text/plain\r\n\r\n";
+    for (int time = Json::asInt(request->GetParam("times", 1)); time > 0; --time) {
+        all += text;
+    }
+    for (size_t written = 0; written < all.size();) {
+        const ssize_t more = write(STDOUT_FILENO, all.data() + written, all.size() - written);
+        if (more <= 0) {
+            response->SetError(1003, Json::Value());
+            return;
+        }
+        written += static_cast<size_t>(more);
+    }
+    if (Json::asBool(request->GetParam("dies", false))) {
+        Die(request, response);
+    }
+    response->SetSuccess(Json::Value());
+}
+
+/** A result of "size" bytes. */
+void AnswerLong(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
+    const int size = Json::asInt(request->GetParam("size", 0));
+    response->SetSuccess(std::string(static_cast<size_t>(size), 'r'));
+}
+
+void Work(ZOVA::APIRequest* request, ZOVA::APIResponse* response, void*) {
+    constexpr unsigned int kLongestStaySeconds = 60;
+    if (Json::asBool(request->GetParam("dies", false))) {
+        Die(request, response);
+    }
+    response->SetSuccess("reported");
+    if (Json::asBool(request->GetParam("stays", false))) {
+        sleep(kLongestStaySeconds);
+    }
+}
+
+/** A task for "group" that reports and, if "stays" is true, waits to be stopped; its record stays. */
+void StartTask(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
+    ZOVA::APIPolling polling(request);
+    polling.SetPrefixAttr("probe-");
+    polling.SetRemoveAttr(false);
+    if (!polling.SetGroupAttr(Json::asString(request->GetParam("group", "")))) {
+        response->SetError(polling.GetError(), Json::Value());
+        return;
+    }
+    polling.Start(response, Work, nullptr);
+}
+
 bool RefuseWithAnError(ZOVA::APIRequest*, ZOVA::APIResponse* response) {
     response->SetError(1002, Json::Value());
     return false;
@@ -62,6 +114,10 @@ const ZOVA::_tag_API_TABLE kTable[] = {
     {kAPI, 1, "check_throws", Tell},
     {kAPI, 1, "wait", Wait},
     {kAPI, 1, "dies", Die},
+    {kAPI, 1, "write", Write},
+    {kAPI, 1, "write_lasting", Write},
+    {kAPI, 1, "answer_long", AnswerLong},
+    {kAPI, 1, "start_task", StartTask},
     {nullptr, 0, nullptr, nullptr},
 };
 
