@@ -3,6 +3,7 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include <limits>
 #include <set>
 
 #include "TaskDevice.h"
@@ -35,6 +36,15 @@ void AgeRemoval(const std::string& owner, const std::string& id, unsigned int se
     ASSERT_GT(record["removed_at"].asUInt64(), seconds) << "the machine has not run that long";
     record["removed_at"] = Json::UInt64(record["removed_at"].asUInt64() - seconds);
     WriteFile(path, Json::toString(record), status.st_uid, status.st_mode & 0777);
+}
+
+/** Makes all that lies in the store two days old, then the next sweep due, and sweeps. */
+void SweepAfterTwoDays() {
+    for (const std::string& file : FilesIn(TaskFolder())) {
+        MakeOlder(TaskFolder() + "/" + file, 2 * 24 * 60 * 60);
+    }
+    MakeOlder(InRoot("/run/zova/tasks.swept"), 31);
+    TaskUtil::getUniqueID("alice", "");
 }
 
 }  // namespace
@@ -177,6 +187,20 @@ TEST_F(TaskStoreTest, RefusesAValueThatCouldNotBeReadAgain) {
     EXPECT_FALSE(task.setProperty("body", deep));
     EXPECT_FALSE(task.setProperty("body", std::string(9 << 20, 'x'))) << "longer than a record may be";
     EXPECT_TRUE(Task("alice", "1").hasProperty("info"));
+}
+
+TEST_F(TaskStoreTest, KeepsANumberThatJsonCannotHoldAsNull) {
+    constexpr double kInfinity = std::numeric_limits<double>::infinity();
+    Json::Value body = Parse(R"({"text":"1e+9999","part":0.5})");
+    body["percent"] = kInfinity;
+    body["left"].append(-kInfinity);
+    body["left"].append(std::numeric_limits<double>::quiet_NaN());
+    ASSERT_TRUE(MakeRecord("alice", "1"));
+    EXPECT_TRUE(Task("alice", "1").setProperty("body", body));
+    const Task task("alice", "1");
+    EXPECT_TRUE(task.hasProperty("info")) << "the record can be read";
+    EXPECT_EQ(Json::toString(task.getProperty("body")),
+              R"({"left":[null,null],"part":0.5,"percent":null,"text":"1e+9999"})");
 }
 
 TEST_F(TaskStoreTest, KeepsTheOldRecordWhenAWriteFails) {
@@ -329,6 +353,47 @@ TEST_F(TaskStoreTest, SweepsWhatIsOverAndNothingElse) {
     const std::vector<std::string> files = FilesIn(TaskFolder());
     const std::string alice = "616c696365.";
     EXPECT_EQ(files, (std::vector<std::string>{alice + "fresh", alice + "kept", alice + "new", alice + "running"}));
+}
+
+TEST_F(TaskStoreTest, SweepsNoRecordOnlyBecauseNobodyKnowsItsUser) {
+    for (const char* id : {"crashed", "kept", "linked", "open", "running"}) {
+        ASSERT_TRUE(MakeRecord("far", id));
+        ASSERT_TRUE(Task("far", id).setCreatePid(id == std::string("crashed") ? 0 : getpid()));
+    }
+    ASSERT_TRUE(Task("far", "kept").finish(false));
+    ASSERT_EQ(link(RecordPath("far", "linked").c_str(), InRoot("/run/zova/link").c_str()), 0);
+    ASSERT_EQ(chmod(RecordPath("far", "open").c_str(), 0644), 0);
+    // What "far" keeps is not believed while the user database does not know "far".
+    for (const char* id : {"crashed", "kept", "linked", "open", "running"}) {
+        ASSERT_EQ(chown(RecordPath("far", id).c_str(), kUnknownUid, kUnknownUid), 0);
+        ASSERT_FALSE(TaskUtil::checkTaskExists("far", id));
+    }
+    ASSERT_TRUE(MakeRecord("far", "forged"));
+    ASSERT_TRUE(Task("far", "forged").setCreatePid(getpid()));
+    ASSERT_EQ(chown(RecordPath("far", "forged").c_str(), kAlice.uid, kAlice.uid), 0);
+    SweepAfterTwoDays();
+    EXPECT_EQ(FilesIn(TaskFolder()), (std::vector<std::string>{"666172.kept", "666172.running"}));
+}
+
+TEST_F(TaskStoreTest, SweepsNoRecordOnlyBecauseItCannotBeOpenedNow) {
+    ASSERT_TRUE(MakeRecord("alice", "1"));
+    ASSERT_TRUE(Task("alice", "1").setCreatePid(getpid()));
+    ASSERT_TRUE(TaskUtil::checkTaskExists("alice", "1"));
+    // The first goes to the list of the folder, the second to the record.
+    for (const int descriptors : {1, 2}) {
+        EXPECT_EQ(StatusOfChild([descriptors] {
+                      const rlim_t lowest = static_cast<rlim_t>(dup(STDERR_FILENO));
+                      close(static_cast<int>(lowest));
+                      const struct rlimit few = {lowest + descriptors, lowest + descriptors};
+                      if (setrlimit(RLIMIT_NOFILE, &few) != 0) {
+                          return 1;
+                      }
+                      SweepAfterTwoDays();
+                      return ::testing::Test::HasFailure() ? 2 : 0;
+                  }),
+                  0);
+        EXPECT_TRUE(Task("alice", "1").hasProperty("info")) << descriptors;
+    }
 }
 
 TEST_F(TaskStoreTest, SweepsAtMostOnceInHalfAMinute) {

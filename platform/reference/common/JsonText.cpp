@@ -3,6 +3,7 @@
 #include <json/reader.h>
 #include <json/writer.h>
 
+#include <cmath>
 #include <exception>
 #include <memory>
 
@@ -20,6 +21,21 @@ std::unique_ptr<Json::CharReader> MakeReader() {
     builder["failIfExtra"] = true;
     builder["stackLimit"] = kJsonDepth + 2;
     return std::unique_ptr<Json::CharReader>(builder.newCharReader());
+}
+
+/** What the stock library makes of an infinite number, and does not read again. */
+constexpr const char* kInfinity = "1e+9999";
+
+void MakeFinite(Json::Value& value) {
+    if (value.type() == Json::realValue) {
+        if (!std::isfinite(value.asDouble())) {
+            value = Json::Value();
+        }
+    } else if (value.type() == Json::arrayValue || value.type() == Json::objectValue) {
+        for (Json::Value& element : value) {
+            MakeFinite(element);
+        }
+    }
 }
 
 }  // namespace
@@ -46,7 +62,13 @@ std::string WriteJson(const Json::Value& value) {
     Json::StreamWriterBuilder builder;
     builder["indentation"] = "";
     builder["emitUTF8"] = true;
-    return Json::writeString(builder, value);
+    std::string text = Json::writeString(builder, value);
+    if (text.find(kInfinity) == std::string::npos) {
+        return text;
+    }
+    Json::Value finite = value;
+    MakeFinite(finite);
+    return Json::writeString(builder, finite);
 }
 
 ReadResult ReadJson(const char* path, size_t limit, FileTrust trust, Json::Value& out) {

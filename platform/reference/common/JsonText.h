@@ -16,7 +16,7 @@ namespace reference {
  */
 bool ParseJson(std::string_view text, Json::Value& out);
 
-/** Compact text, members sorted, no newline at the end. */
+/** Compact text, members sorted, no newline at the end. A number that JSON cannot hold (NaN, infinity) becomes null. */
 std::string WriteJson(const Json::Value& value);
 
 /** Reads and parses a file; `out` is left alone unless the result is kGood. */

@@ -6,13 +6,16 @@
 #include <unistd.h>
 
 #include <ctime>
+#include <string>
 #include <string_view>
 
 #include "Paths.h"
+#include "common/Accounts.h"
+#include "common/Files.h"
 #include "common/UniqueFd.h"
 #include "taskmanager/TaskProcess.h"
 #include "taskmanager/TaskRecord.h"
-#include "taskmanager/TaskStore.h"
+#include "taskmanager/TaskTrust.h"
 
 namespace reference {
 
@@ -39,17 +42,39 @@ bool IsDue() {
     return stamp.IsOpen();
 }
 
-bool IsAbandoned(std::string_view file) {
+/**
+ * Whether the file may hold a record of that owner. A user database that cannot be asked knows nobody, which makes no
+ * record of a running task junk.
+ */
+bool MayBeRecord(const struct stat& status, const std::string& owner) {
+    return S_ISREG(status.st_mode) && status.st_nlink == 1 && (status.st_mode & 077) == 0 &&
+           status.st_size <= static_cast<off_t>(kLargestTaskRecord) &&
+           (MayKeepTasks(status.st_uid, owner) || !FindAccountOf(status.st_uid));
+}
+
+bool IsAbandoned(int folder, const char* file, const struct stat& status) {
+    constexpr int kFlags = O_RDONLY | O_CLOEXEC | O_NOFOLLOW | O_NONBLOCK | O_NOCTTY;
     const auto key = KeyOfTaskFile(file);
-    TaskStore::Entry entry;
-    if (!key || TaskStore::Load(*key, entry) != TaskStore::Result::kGood) {
+    if (!key || !MayBeRecord(status, key->owner)) {
         return true;
     }
-    return !entry.record.finished && !IsProcessRunning(entry.record.pid, entry.record.processStart);
+    UniqueFd open(openat(folder, file, kFlags));
+    std::string text;
+    if (!open.IsOpen() || !ReadAll(open.Get(), kLargestTaskRecord, text)) {
+        // The system is short of something: the next sweep will tell.
+        return false;
+    }
+    // The look at the process needs a descriptor, which may be the last one.
+    open.Reset(-1);
+    TaskRecord record;
+    if (!ParseTaskRecord(text, *key, record) || record.IsExpired(SecondsSinceBoot())) {
+        return true;
+    }
+    return !record.finished && !IsProcessRunning(record.pid, record.processStart);
 }
 
 /** What lies there waits for its removal by its mode alone: only the file's owner can have set it. */
-bool IsToBeSwept(const char* file, const struct stat& status) {
+bool IsToBeSwept(int folder, const char* file, const struct stat& status) {
     const time_t age = AgeOf(status);
     if (S_ISDIR(status.st_mode) || age < static_cast<time_t>(kTaskKeptSeconds)) {
         return false;
@@ -62,7 +87,7 @@ bool IsToBeSwept(const char* file, const struct stat& status) {
     if (std::string_view(file).substr(0, kUnfinished.size()) == kUnfinished) {
         return true;
     }
-    return age >= kDay && IsAbandoned(file);
+    return age >= kDay && IsAbandoned(folder, file, status);
 }
 
 }  // namespace
@@ -78,7 +103,7 @@ void SweepTasks() {
     while (const struct dirent* file = readdir(directory)) {
         struct stat status;
         if (fstatat(dirfd(directory), file->d_name, &status, AT_SYMLINK_NOFOLLOW) == 0 &&
-            IsToBeSwept(file->d_name, status)) {
+            IsToBeSwept(dirfd(directory), file->d_name, status)) {
             unlinkat(dirfd(directory), file->d_name, 0);
         }
     }
