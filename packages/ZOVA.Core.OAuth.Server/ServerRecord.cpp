@@ -58,7 +58,11 @@ bool IsNameByte(char c) {
 /** "Name: value". A name without a value would take a header away instead of adding one. */
 bool IsHeaderLine(const std::string& line) {
     const std::size_t colon = line.find(':');
-    return colon != std::string::npos && colon > 0 && std::all_of(line.begin(), line.begin() + colon, IsNameByte) &&
+    if (colon == std::string::npos || colon == 0) {
+        return false;
+    }
+    const std::string name = line.substr(0, colon);
+    return std::all_of(name.begin(), name.end(), IsNameByte) &&
            line.find_first_not_of(" \t", colon + 1) != std::string::npos;
 }
 

@@ -75,7 +75,7 @@ bool ReadRecords(const RecordList& list, ZOVA::APIResponse* response, Json::Valu
 
 void ReplaceRecords(const RecordList& list, ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
     const auto given = request->GetAndCheckArray(list.parameter, ZOVA::APIRequest::PARAM_REQUIRED);
-    const Json::Value records = given.Get();
+    const Json::Value& records = given.Get();
     if (given.IsInvalid() || given.IsReset() || records.size() > list.most) {
         RefuseParameter(response, list.parameter);
         return;
