@@ -14,7 +14,7 @@ const [modules, key, certificate] = process.argv.slice(2);
 const find = createRequire(pathToFileURL(`${modules}/`));
 const { Provider } = await import(pathToFileURL(find.resolve("oidc-provider")));
 
-const SCOPES = ["users", "users.list", "sessions", "nothing"];
+const SCOPES = ["users", "users.list", "core", "batches", "elsewhere", "unknown"];
 const secret = () => randomBytes(24).toString("hex");
 const application = { id: "application", secret: secret() };
 const device = { id: "device", secret: secret() };
