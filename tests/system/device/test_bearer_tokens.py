@@ -353,6 +353,11 @@ class AnyServer(TokenCase):
         self.assert_refused(call(TOKEN))
         self.assertEqual([], server.asked)
 
+    def test_an_api_that_is_open_to_everybody_asks_no_server(self):
+        server = self.set_answer(oauth.answering(self.GOOD))
+        self.assertEqual(0, call(TOKEN, {"api": "ZOVA.Core.Session", "version": 1, "method": "cipher"}).code())
+        self.assertEqual([], server.asked)
+
     def test_each_call_asks_anew_and_a_batch_once(self):
         server = self.set_answer(oauth.answering({"user": "alice", "scope": "users batches"}))
         call(TOKEN)
