@@ -89,14 +89,6 @@ TEST(Sharing, HasNoDatabase) {
     EXPECT_FALSE(db::TokenDB(database).GetBySessionEntry(session, entry, token));
 }
 
-TEST(AccessToken, IsAlwaysRefusedAndLeavesTheNameAlone) {
-    const std::string token("token");
-    char user[493] = "before";
-    EXPECT_LT(ZovaAccessTokenGrant(&token, "ZOVA.Core.User", "get", user, sizeof(user)), 0);
-    EXPECT_LT(ZovaAccessTokenGrant(nullptr, nullptr, nullptr, nullptr, 0), 0);
-    EXPECT_STREQ(user, "before");
-}
-
 TEST_F(WebServer, RunsTheCommandWithItsArgumentsAndNoShell) {
     const std::string target = InRoot("/scratch/$(touch x);made");
     EXPECT_TRUE(Restart("{\"restart\":[\"/usr/bin/touch\",\"" + target + "\"]}"));

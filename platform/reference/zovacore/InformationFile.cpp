@@ -8,6 +8,7 @@
 
 #include "Paths.h"
 #include "Seam.h"
+#include "common/ControlBytes.h"
 #include "common/Files.h"
 #include "common/KeyValueText.h"
 #include "common/TimedLock.h"
@@ -28,12 +29,8 @@ bool IsKey(std::string_view key) {
 }
 
 bool IsValue(std::string_view value) {
-    for (const unsigned char byte : value) {
-        if (byte < 0x20 || byte == 0x7f || byte == '"') {
-            return false;
-        }
-    }
-    return value.size() <= kLongestValue;
+    return value.size() <= kLongestValue && !reference::HasControlByte(value) &&
+           value.find('"') == std::string_view::npos;
 }
 
 bool WriteLike(int descriptor, std::string_view content, const struct stat& before) {
