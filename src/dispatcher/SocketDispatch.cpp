@@ -73,7 +73,7 @@ bool Forward(const std::string& path, const APIRequest& request, const APIRespon
 
 bool APIRunner::CanProcessSocket(APIRequest* call) {
     // The daemon itself must not forward to itself.
-    if (getenv("in_zovaapid") != nullptr) {
+    if (call == nullptr || getenv("in_zovaapid") != nullptr) {
         return false;
     }
     const std::string path = SocketOf(*call);

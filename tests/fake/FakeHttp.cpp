@@ -5,6 +5,7 @@
 #include <curl/curl.h>
 
 #include <cerrno>
+#include <csignal>
 #include <cstdarg>
 #include <cstdlib>
 #include <cstring>
@@ -134,6 +135,13 @@ bool Deliver(const std::vector<std::string>& pieces, Callback write, void* data)
     return true;
 }
 
+/** Whether a peer that closes its end would end this process. */
+bool DiesOfBrokenPipes() {
+    struct sigaction now {};
+    sigaction(SIGPIPE, nullptr, &now);
+    return now.sa_handler != SIG_IGN;
+}
+
 CURLcode Perform(CURL* handle) {
     FakePlatform& platform = FakePlatform::Required("curl_easy_perform");
     Transfer& transfer = Of(handle);
@@ -142,7 +150,8 @@ CURLcode Perform(CURL* handle) {
                                         ? std::string(transfer.fields)
                                         : std::string(transfer.fields, static_cast<std::size_t>(transfer.fieldsSize));
     platform.httpRequests.push_back(request);
-    if (!platform.Enter("curl_easy_perform", request.options["URL"], ECONNREFUSED)) {
+    const std::string danger = DiesOfBrokenPipes() ? ", dies of broken pipes" : "";
+    if (!platform.Enter("curl_easy_perform", request.options["URL"] + danger, ECONNREFUSED)) {
         return CURLE_COULDNT_CONNECT;
     }
     const auto server = platform.httpServers.find(request.options["URL"]);

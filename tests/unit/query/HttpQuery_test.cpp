@@ -143,6 +143,11 @@ TEST_F(HttpQueryTest, AHeaderBlockBeyondItsLimitEndsTheTransfer) {
     ExpectFailureThatLeavesEverything();
 }
 
+TEST_F(HttpQueryTest, APeerThatClosesItsEndDoesNotEndTheProcess) {
+    EXPECT_TRUE(Query());
+    EXPECT_EQ(platform.CallsOf({"curl_easy_perform"}), (Texts{"curl_easy_perform(https://idp.example/)"}));
+}
+
 TEST_F(HttpQueryTest, TheDispositionOfBrokenPipesIsAsBefore) {
     struct sigaction mine {};
     mine.sa_handler = [](int) {};
