@@ -41,7 +41,7 @@ void Answer(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
         return;
     }
     const auto apis = request->GetAndCheckArray(kApis, ZOVA::APIRequest::PARAM_REQUIRED);
-    if (apis.IsInvalid() || !apis.IsSet()) {
+    if (apis.IsInvalid() || apis.IsReset() || !apis.IsSet()) {
         RefuseParameter(response, kApis);
         return;
     }

@@ -20,7 +20,7 @@ void Answer(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
         return;
     }
     const auto id = request->GetAndCheckString(kId, ZOVA::APIRequest::PARAM_REQUIRED);
-    if (id.IsInvalid() || !id.IsSet() || HasControlBytes(id.Get())) {
+    if (id.IsInvalid() || id.IsReset() || !id.IsSet() || HasControlBytes(id.Get())) {
         RefuseParameter(response, kId);
         return;
     }
