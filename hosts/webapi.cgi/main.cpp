@@ -4,8 +4,8 @@
 #include <sys/stat.h>
 #include <webapi/WebEntry.h>
 
+#include "../common/StandardDescriptors.h"
 #include "LastResort.h"
-#include "StandardDescriptors.h"
 
 int main(int argc, char** argv) {
     if (!host::OpenStandardDescriptors()) {

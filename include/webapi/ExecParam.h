@@ -78,6 +78,9 @@ public:
     void RunFork();
     void RunForkForStdout();
 
+    /** What `Process` returns, for those who call its steps one by one. Null before the call has run. */
+    const Json::Value& GetResult() const;
+
 private:
     const ExecParam* param;
     APIRunner runner;

@@ -1,7 +1,7 @@
 #include "Cipher.h"
 
 #include "../common/Fence.h"
-#include "PlatformLogin.h"
+#include "../common/PlatformLogin.h"
 
 namespace package {
 namespace {

@@ -1,9 +1,9 @@
 #include "Get.h"
 
+#include "../common/ClientSession.h"
 #include "../common/Fence.h"
 #include "../common/PlatformAccounts.h"
 #include "../common/Text.h"
-#include "ClientSession.h"
 #include "SessionStatus.h"
 
 namespace package {

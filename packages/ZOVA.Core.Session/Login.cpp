@@ -1,12 +1,12 @@
 #include "Login.h"
 
+#include "../common/ClientSession.h"
 #include "../common/Fence.h"
 #include "../common/Parameters.h"
 #include "../common/PlatformAccounts.h"
+#include "../common/PlatformLogin.h"
 #include "../common/Text.h"
-#include "ClientSession.h"
 #include "LoginParameters.h"
-#include "PlatformLogin.h"
 #include "SessionCookie.h"
 #include "SessionErrors.h"
 

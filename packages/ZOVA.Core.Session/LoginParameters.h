@@ -4,7 +4,7 @@
 
 #include <string>
 
-#include "Secret.h"
+#include "../common/Secret.h"
 
 namespace package {
 

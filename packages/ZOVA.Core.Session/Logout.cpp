@@ -1,7 +1,7 @@
 #include "Logout.h"
 
+#include "../common/ClientSession.h"
 #include "../common/Fence.h"
-#include "ClientSession.h"
 #include "SessionCookie.h"
 
 namespace package {

@@ -29,6 +29,11 @@ constexpr const char* kAppPrivileges = ZOVA_REFERENCE_ROOT "/etc/zova/app-privil
 constexpr const char* kWebServer = ZOVA_REFERENCE_ROOT "/etc/zova/web-server.json";
 
 constexpr const char* kDeviceInformation = ZOVA_REFERENCE_ROOT "/etc/zovainfo.conf";
+/** What is to become the file above. One name for all writers: the next of them removes what a killed one left. */
+constexpr const char* kNewDeviceInformation = ZOVA_REFERENCE_ROOT "/etc/.zovainfo.conf.new";
+/** In a folder that only root can enter, so that nobody else can hold the lock. */
+constexpr const char* kDeviceInformationLock = ZOVA_REFERENCE_ROOT "/etc/zova/.information-lock";
+constexpr const char* kAccessTokenDirectory = ZOVA_REFERENCE_ROOT "/var/lib/zova/access-tokens";
 constexpr const char* kGroupDirectory = ZOVA_REFERENCE_ROOT "/var/lib/zova/groups";
 // Null: wherever the system keeps its PAM services.
 constexpr const char* kPamDirectory = sizeof(ZOVA_REFERENCE_ROOT) > 1 ? ZOVA_REFERENCE_ROOT "/etc/pam.d" : nullptr;

@@ -22,5 +22,6 @@
 #include "zovalogin.h"
 #include "zovasdk.h"
 #include "zovasharing.h"
+#include "zovatokens.h"
 #include "zovaw3.h"
 #pragma GCC visibility pop

@@ -8,6 +8,7 @@
 #include "dispatcher/NiceScope.h"
 #include "dispatcher/PermissionFrame.h"
 #include "dispatcher/StreamScope.h"
+#include "dispatcher/UploadFrame.h"
 #include "envelope/APIRequestPrivate.h"
 #include "webapi/APIResponse.h"
 #include "webapi/APIRunner.h"
@@ -170,12 +171,8 @@ bool APIRunner::ProcessLib(APIRequest* call, APIResponse* answer) {
 
     const HatScope hat(name.api, name.method);
 
-    if (call->IsUploadRequest()) {
-        const bool uploaded = allowUpload && HandleUpload(call, answer);
-        APIRequestPrivate::Of(*call).SetCallName(name);
-        if (!uploaded) {
-            return false;
-        }
+    if (!TakesUpload(*this, name, attributes, call, answer)) {
+        return false;
     }
 
     _tag_API_TABLE* table = nullptr;

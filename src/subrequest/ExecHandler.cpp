@@ -197,6 +197,10 @@ void ExecHandler::RunForkForStdout() {
     }
 }
 
+const Json::Value& ExecHandler::GetResult() const {
+    return execResult;
+}
+
 // ---- the short ways, without a runner of the caller's own ----
 
 Json::Value APIRunner::Exec(const ExecParam& param) {

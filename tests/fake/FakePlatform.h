@@ -2,12 +2,15 @@
 
 #include <json/value.h>
 
+#include <cstdint>
+#include <functional>
 #include <map>
 #include <set>
 #include <string>
 #include <utility>
 #include <vector>
 
+#include "FakeHttp.h"
 #include "FakeProcess.h"
 #include "ForkedChildren.h"
 
@@ -40,6 +43,12 @@ struct Session {
 struct DeviceToken {
     std::string user;
     std::set<std::pair<std::string, std::string>> calls;
+};
+
+/** A connection to a service, and the last text sent over it. */
+struct Connection {
+    std::string path;
+    std::string request;
 };
 
 /** What `QLIBCProcFork` does: the code behind it runs as the parent, as the child, or sees a refusal. */
@@ -107,6 +116,17 @@ public:
     /** Sharing links by hash. */
     std::set<std::string> sharingEntries;
     bool sharingDatabaseGood = true;
+
+    /** Services behind unix sockets: what each answers to a text, by path. */
+    std::map<std::string, std::function<std::string(const std::string&)>> services;
+    std::vector<Connection> connections;
+    int openConnections = 0;
+    std::uint16_t httpsPort = 5001;
+    /** What answers at an URL; any other cannot be reached. */
+    std::map<std::string, HttpAnswer> httpServers;
+    std::vector<HttpRequest> httpRequests;
+    /** Handles and header lines of libcurl that nobody has given back. */
+    int curlObjects = 0;
 
     FakeProcess process;
     ForkedChildren children;

@@ -39,6 +39,19 @@ int QLIBCFileCheckKeyValue(const char* path, const char* key, const char* value,
     return pair != file->second.end() && pair->second == value ? 1 : 0;
 }
 
+int QLIBCINFOSetKeyValue(const char* key, const char* value) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    if (!platform.Enter(__func__, std::string(key) + ", " + value, EROFS)) {
+        return -1;
+    }
+    if (platform.process.user.effective != 0 || platform.process.group.effective != 0) {
+        errno = EACCES;
+        return -1;
+    }
+    platform.keyValueFiles["/etc/zovainfo.conf"][key] = value;
+    return 0;
+}
+
 int QLIBCFileTouch(const char* path) {
     return FakePlatform::Required(__func__).Enter(__func__, path, EACCES) ? 0 : -1;
 }

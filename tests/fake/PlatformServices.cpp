@@ -129,4 +129,10 @@ bool ZELM::RestartService() {
     return true;
 }
 
+std::uint16_t ZELM::GetHttpsPort() {
+    FakePlatform& platform = FakePlatform::Required("GetHttpsPort");
+    platform.Enter("GetHttpsPort", engine == nullptr ? "no engine" : "", 0);
+    return platform.httpsPort;
+}
+
 }  // namespace zovaw3

@@ -1,4 +1,4 @@
-// Loading of libraries: real, recorded, failing on demand.
+// Loading of libraries: real but for libcurl, recorded, failing on demand.
 
 #include <dlfcn.h>
 
@@ -29,6 +29,9 @@ FAKE_EXPORT void* __wrap_dlopen(const char* path, int mode) {
         madeUpError = "made-up loading error";
         return nullptr;
     }
+    if (platform != nullptr && path != nullptr && std::string(path) == "libcurl.so.4") {
+        return fake::CurlHandle();
+    }
     return __real_dlopen(path, mode);
 }
 
@@ -37,6 +40,9 @@ FAKE_EXPORT void* __wrap_dlsym(void* handle, const char* name) {
     if (platform != nullptr && !platform->Enter("dlsym", name, ENOENT)) {
         madeUpError = "made-up symbol error";
         return nullptr;
+    }
+    if (handle == fake::CurlHandle()) {
+        return fake::CurlFunction(name);
     }
     return __real_dlsym(handle, name);
 }

@@ -2,8 +2,8 @@
 
 #include <cstdio>
 
-#include "../../packages/ZOVA.Core.Session/PlatformLogin.h"
 #include "../../packages/common/PlatformAccounts.h"
+#include "../../packages/common/PlatformLogin.h"
 
 FakeLogin& FakeLogin::Instance() {
     static FakeLogin fake;

@@ -23,7 +23,7 @@ constexpr int kResults[] = {ZOVA_LOGIN_OK, ZOVA_LOGIN_REFUSED, ZOVA_LOGIN_BLOCKE
 #define ZovaSessionUser ImportedSessionUser
 #define ZovaSessionRemove ImportedSessionRemove
 #define ZovaCipherPublicKey ImportedCipherPublicKey
-#include "../../packages/ZOVA.Core.Session/PlatformLogin.h"
+#include "../../packages/common/PlatformLogin.h"
 #undef ZovaLoginResult
 #undef ZOVA_LOGIN_OK
 #undef ZOVA_LOGIN_REFUSED

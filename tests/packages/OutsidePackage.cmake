@@ -34,7 +34,7 @@ endfunction()
 file(REMOVE_RECURSE ${WORK})
 run(${CMAKE_COMMAND} -E env DESTDIR=${root} ${CMAKE_COMMAND} --install ${BUILD} --prefix /usr)
 check_exists(${root}/usr/include/webapi/APIRequest.h ${root}/usr/lib/pkgconfig/webapi-ZELM5.pc)
-foreach(package ZOVA.Core.Session ZOVA.Core.System ZOVA.Core.User)
+foreach(package ZOVA.Core.Session ZOVA.Core.System ZOVA.Core.Token ZOVA.Core.User)
     check_exists(${root}/usr/lib/zova/webapi/${package}.so ${root}/usr/zova/zovaman/webapi/${package}.lib)
 endforeach()
 

@@ -1,4 +1,4 @@
-#include "../../packages/ZOVA.Core.Session/Secret.h"
+#include "../../packages/common/Secret.h"
 
 #include <gtest/gtest.h>
 

@@ -34,6 +34,11 @@ std::string LinkProbeLine(const std::string& title) {
     return "";
 }
 
+int PortOf(const std::string& file) {
+    WriteFile(InRoot("/etc/zova/web-server.json"), file);
+    return zovaw3::ZELM(zovaw3::Engine::CreatePrivate()).GetHttpsPort();
+}
+
 size_t Count(const std::string& text, const std::string& part) {
     size_t count = 0;
     for (size_t at = text.find(part); at != std::string::npos; at = text.find(part, at + 1)) {
@@ -84,14 +89,6 @@ TEST(Sharing, HasNoDatabase) {
     EXPECT_FALSE(db::TokenDB(database).GetBySessionEntry(session, entry, token));
 }
 
-TEST(AccessToken, IsAlwaysRefusedAndLeavesTheNameAlone) {
-    const std::string token("token");
-    char user[493] = "before";
-    EXPECT_LT(ZovaAccessTokenGrant(&token, "ZOVA.Core.User", "get", user, sizeof(user)), 0);
-    EXPECT_LT(ZovaAccessTokenGrant(nullptr, nullptr, nullptr, nullptr, 0), 0);
-    EXPECT_STREQ(user, "before");
-}
-
 TEST_F(WebServer, RunsTheCommandWithItsArgumentsAndNoShell) {
     const std::string target = InRoot("/scratch/$(touch x);made");
     EXPECT_TRUE(Restart("{\"restart\":[\"/usr/bin/touch\",\"" + target + "\"]}"));
@@ -117,4 +114,24 @@ TEST_F(WebServer, IgnoresAFileThatOthersCanWrite) {
     ASSERT_TRUE(Restart(R"({"restart":["/bin/true"]})"));
     ASSERT_EQ(chmod(InRoot("/etc/zova/web-server.json").c_str(), 0622), 0);
     EXPECT_FALSE(zovaw3::ZELM(zovaw3::Engine::CreatePrivate()).RestartService());
+}
+
+TEST_F(WebServer, TellsTheConfiguredHttpsPort) {
+    EXPECT_EQ(PortOf(R"({"https_port":1})"), 1);
+    EXPECT_EQ(PortOf(R"({"https_port":5001,"restart":["/bin/true"]})"), 5001);
+    EXPECT_EQ(PortOf(R"({"https_port":65535})"), 65535);
+}
+
+TEST_F(WebServer, IsAt443WithoutAUsablePort) {
+    EXPECT_EQ(zovaw3::ZELM(zovaw3::Engine::CreatePrivate()).GetHttpsPort(), 443);
+    EXPECT_EQ(zovaw3::ZELM(nullptr).GetHttpsPort(), 443);
+    for (const char* file :
+         {"", "[]", "{}", "null", "5001", R"({"https_port":0})", R"({"https_port":-1})", R"({"https_port":65536})",
+          R"({"https_port":4295032296})", R"({"https_port":18446744073709551615})", R"({"https_port":5001.5})",
+          R"({"https_port":"5001"})", R"({"https_port":true})", R"({"https_port":null})", R"({"https_port":[5001]})"}) {
+        EXPECT_EQ(PortOf(file), 443) << file;
+    }
+    ASSERT_EQ(PortOf(R"({"https_port":5001})"), 5001);
+    ASSERT_EQ(chmod(InRoot("/etc/zova/web-server.json").c_str(), 0622), 0);
+    EXPECT_EQ(zovaw3::ZELM(zovaw3::Engine::CreatePrivate()).GetHttpsPort(), 443);
 }

@@ -106,4 +106,9 @@ bool IsLockedAway(const char* name) {
     return locked;
 }
 
+bool IsInForce(const std::string& name, uid_t uid) {
+    const auto account = FindAccount(name.c_str());
+    return account && account->uid == uid && account->uid != 0 && name != kSystemUser && !IsLockedAway(name.c_str());
+}
+
 }  // namespace reference

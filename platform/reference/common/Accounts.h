@@ -34,6 +34,12 @@ bool IsInGroup(const Account& account, const char* group);
 /** Whether the account is locked or has expired by the shadow database; an account without an entry there is not. */
 bool IsLockedAway(const char* name);
 
+/**
+ * Whether calls may still be made in the name of an account that was found with this user id before: it is there, the
+ * same one, not locked away and not root's.
+ */
+bool IsInForce(const std::string& name, uid_t uid);
+
 /** Name of the group whose members administer the device. */
 constexpr const char* kAdministrators = "administrators";
 

@@ -16,6 +16,8 @@ namespace crypto {
 
 namespace {
 
+constexpr size_t kDigestSize = 32;
+
 LazyModule module(paths::kCryptoModule);
 
 ZovaBytes BytesOf(std::string_view text) {
@@ -70,10 +72,15 @@ bool PublicKey(std::string_view pem, std::string& der) {
 }
 
 bool HmacSha256(std::string_view key, std::string_view data, std::string& digest) {
-    constexpr size_t kDigestSize = 32;
     auto* hmac = module.Find<decltype(ZovaCryptoHmacSha256)>("ZovaCryptoHmacSha256");
     digest.assign(kDigestSize, '\0');
     return hmac != nullptr && hmac(BytesOf(key), BytesOf(data), digest.data()) == 0;
+}
+
+bool Sha256(std::string_view data, std::string& digest) {
+    auto* hash = module.Find<decltype(ZovaCryptoSha256)>("ZovaCryptoSha256");
+    digest.assign(kDigestSize, '\0');
+    return hash != nullptr && hash(BytesOf(data), digest.data()) == 0;
 }
 
 }  // namespace crypto

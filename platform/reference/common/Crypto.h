@@ -38,6 +38,9 @@ bool PublicKey(std::string_view pem, std::string& der);
 /** 32 bytes. */
 bool HmacSha256(std::string_view key, std::string_view data, std::string& digest);
 
+/** 32 bytes. */
+bool Sha256(std::string_view data, std::string& digest);
+
 }  // namespace crypto
 
 }  // namespace reference

@@ -39,4 +39,15 @@ std::optional<std::string_view> FindKeyValue(std::string_view text, std::string_
     return found;
 }
 
+std::string WithKeyValue(std::string_view text, std::string_view key, std::string_view value) {
+    std::string changed(text);
+    if (const auto old = FindKeyValue(text, key)) {
+        return changed.replace(static_cast<size_t>(old->data() - text.data()), old->size(), value);
+    }
+    if (!changed.empty() && changed.back() != '\n') {
+        changed += '\n';
+    }
+    return changed.append(key).append("=\"").append(value).append("\"\n");
+}
+
 }  // namespace reference

@@ -4,6 +4,7 @@
 #include "Seam.h"
 #include "common/Accounts.h"
 #include "common/Base64.h"
+#include "common/ControlBytes.h"
 #include "common/Crypto.h"
 #include "common/DeviceInformation.h"
 #include "common/DeviceKeys.h"
@@ -26,12 +27,7 @@ bool CopyOption(const char* text, std::string& out) {
         return false;
     }
     out = text;
-    for (unsigned char byte : out) {
-        if (byte < 0x20 || byte == 0x7f) {
-            return false;
-        }
-    }
-    return true;
+    return !reference::HasControlByte(out);
 }
 
 /** False unless the session is bound to an address or is not to be. */

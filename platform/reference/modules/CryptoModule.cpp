@@ -145,3 +145,7 @@ int ZovaCryptoHmacSha256(ZovaBytes key, ZovaBytes data, char* digest) {
     }
     return 0;
 }
+
+int ZovaCryptoSha256(ZovaBytes data, char* digest) {
+    return EVP_Digest(data.data, data.size, Data(digest), nullptr, EVP_sha256(), nullptr) == 1 ? 0 : -1;
+}

@@ -22,5 +22,7 @@ int ZovaCryptoMakePrivateKey(unsigned int bits, char* pem, size_t size);
 int ZovaCryptoPublicKey(ZovaBytes pem, char* der, size_t size);
 /** Writes 32 bytes. 0 on success. */
 int ZovaCryptoHmacSha256(ZovaBytes key, ZovaBytes data, char* digest);
+/** Writes 32 bytes. 0 on success. */
+int ZovaCryptoSha256(ZovaBytes data, char* digest);
 
 }  // extern "C"

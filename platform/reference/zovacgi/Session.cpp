@@ -1,5 +1,6 @@
 #include "zovacgi/Session.h"
 
+#include "common/ControlBytes.h"
 #include "common/DeviceInformation.h"
 #include "common/JsonText.h"
 #include "zovacgi/SessionId.h"
@@ -7,15 +8,6 @@
 namespace reference {
 
 namespace {
-
-bool HasControlByte(std::string_view text) {
-    for (unsigned char byte : text) {
-        if (byte < 0x20 || byte == 0x7f) {
-            return true;
-        }
-    }
-    return false;
-}
 
 /** A member that has to be a text without control bytes. */
 bool TakeText(const Json::Value& object, const char* name, std::string& out) {

@@ -8,13 +8,6 @@ namespace reference {
 
 namespace {
 
-/** Root has no sessions: whoever logs in is an account that methods can be run as. */
-bool IsAccountInForce(const Session& session) {
-    const auto account = FindAccount(session.user.c_str());
-    return account && account->uid == session.uid && account->uid != 0 && session.user != kSystemUser &&
-           !IsLockedAway(session.user.c_str());
-}
-
 bool IsSameAddress(std::string_view first, std::string_view second) {
     const auto left = NetAddress::Parse(first);
     const auto right = NetAddress::Parse(second);
@@ -30,7 +23,7 @@ bool HasTimedOut(const SessionStore::Entry& entry, int idleMinutes, time_t now) 
 
 SessionVerdict JudgeSession(const SessionStore::Entry& entry, const SessionDemands& demands, time_t now) {
     const Session& session = entry.session;
-    if (!IsAccountInForce(session)) {
+    if (!IsInForce(session.user, session.uid)) {
         return kSessionInterrupted;
     }
     if (demands.checkIdle && !demands.allowTimeout && HasTimedOut(entry, demands.idleMinutes, now)) {

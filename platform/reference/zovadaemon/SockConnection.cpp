@@ -12,6 +12,7 @@
 
 #include "Seam.h"
 #include "zovadaemon/Deadline.h"
+#include "zovadaemon/SocketLimits.h"
 
 // A text on the wire is its length in 8 bytes, the lowest first, and then its bytes.
 
@@ -20,15 +21,11 @@ namespace zovadaemon {
 namespace {
 
 using reference::Deadline;
-using std::chrono::milliseconds;
+using reference::socketLimits;
 
 constexpr std::uint64_t kLargestText = 64U * 1024 * 1024;
 constexpr std::size_t kLengthSize = 8;
 constexpr std::size_t kChunk = 64U * 1024;
-constexpr time_t kConnectSeconds = 5;
-constexpr milliseconds kTransferTime{60'000};
-/** How long the other end may take before its answer begins: a method may run for long. */
-constexpr milliseconds kAnswerTime{600'000};
 
 bool WaitFor(int descriptor, short event, const Deadline& deadline) {
     for (;;) {
@@ -104,15 +101,20 @@ bool SockConnection::Send(const std::string& text) {
     for (std::size_t place = 0; place < kLengthSize; ++place) {
         length[place] = static_cast<char>((std::uint64_t{text.size()} >> (8 * place)) & 0xFF);
     }
-    const Deadline deadline(kTransferTime);
+    const Deadline deadline(socketLimits.transfer);
     return SendAll(fd, length.data(), length.size(), deadline) && SendAll(fd, text.data(), text.size(), deadline);
 }
 
 bool SockConnection::Recv(std::string& text) {
-    if (!WaitFor(fd, POLLIN, Deadline(kAnswerTime))) {
+    if (fd < 0) {
+        // poll would wait for nothing until the time is up.
+        errno = EBADF;
         return false;
     }
-    const Deadline deadline(kTransferTime);
+    if (!WaitFor(fd, POLLIN, Deadline(socketLimits.answer))) {
+        return false;
+    }
+    const Deadline deadline(socketLimits.transfer);
     std::array<char, kLengthSize> bytes;
     if (!ReceiveAll(fd, bytes.data(), bytes.size(), deadline)) {
         return false;
@@ -157,7 +159,8 @@ bool DomainSockConnection::Connect() {
         return false;
     }
     // A full backlog makes a connect wait; this is the limit of that wait.
-    const timeval limit{kConnectSeconds, 0};
+    const auto span = socketLimits.connect.count();
+    const timeval limit{span / 1000, (span % 1000) * 1000};
     if (setsockopt(fd, SOL_SOCKET, SO_SNDTIMEO, &limit, sizeof(limit)) != 0 ||
         connect(fd, reinterpret_cast<const sockaddr*>(&address), sizeof(address)) != 0) {
         const int error = errno == EAGAIN ? ETIMEDOUT : errno;

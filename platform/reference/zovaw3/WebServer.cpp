@@ -11,30 +11,48 @@
 
 namespace zovaw3 {
 
-/** The command that restarts the web server, as a program's absolute path and its arguments. */
+namespace {
+
+constexpr std::uint16_t kDefaultHttpsPort = 443;
+
+}  // namespace
+
 class Engine::Private {
 public:
+    /** The command that restarts the web server, as a program's absolute path and its arguments. */
     std::vector<std::string> restart;
+    std::uint16_t httpsPort = kDefaultHttpsPort;
 };
 
 namespace {
 
-std::vector<std::string> ReadRestartCommand() {
+/** The web server's settings; an empty object if there are none that can be trusted. */
+Json::Value ReadSettings() {
     constexpr size_t kLargest = 65536;
     Json::Value file;
     const auto read =
         reference::ReadJson(reference::paths::kWebServer, kLargest, reference::FileTrust::kRootOnlyWrites, file);
+    return read == reference::ReadResult::kGood && file.isObject() ? file : Json::Value(Json::objectValue);
+}
+
+std::vector<std::string> RestartCommandOf(const Json::Value& settings) {
     std::vector<std::string> words;
-    if (read != reference::ReadResult::kGood || !file.isObject() || !file["restart"].isArray()) {
+    if (!settings["restart"].isArray()) {
         return words;
     }
-    for (const Json::Value& word : file["restart"]) {
+    for (const Json::Value& word : settings["restart"]) {
         if (!word.isString() || word.asString().find('\0') != std::string::npos) {
             return {};
         }
         words.push_back(word.asString());
     }
     return words;
+}
+
+std::uint16_t HttpsPortOf(const Json::Value& settings) {
+    const Json::Value& port = settings["https_port"];
+    return port.isInt() && port.asInt() >= 1 && port.asInt() <= UINT16_MAX ? static_cast<std::uint16_t>(port.asInt())
+                                                                           : kDefaultHttpsPort;
 }
 
 /** Runs the program with a fixed environment and waits for it. True if it ended with status 0. */
@@ -68,7 +86,9 @@ bool RunToSuccess(const std::vector<std::string>& words) {
 
 std::shared_ptr<Engine::Private> Engine::CreatePrivate() {
     auto engine = std::make_shared<Private>();
-    engine->restart = ReadRestartCommand();
+    const Json::Value settings = ReadSettings();
+    engine->restart = RestartCommandOf(settings);
+    engine->httpsPort = HttpsPortOf(settings);
     return engine;
 }
 
@@ -81,6 +101,10 @@ bool ZELM::RestartService() {
         return false;
     }
     return RunToSuccess(engine->restart);
+}
+
+std::uint16_t ZELM::GetHttpsPort() {
+    return engine ? engine->httpsPort : kDefaultHttpsPort;
 }
 
 }  // namespace zovaw3

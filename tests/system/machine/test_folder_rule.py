@@ -19,7 +19,7 @@ GOOD = {
     "packages/P/P.cpp": '#include "P.h"\n#include "../common/C.h"\n#include <webapi/Public.h>\n',
     "packages/P/P.h": "",
     "packages/common/C.h": "",
-    "hosts/h/main.cpp": '#include <webapi/Public.h>\n',
+    "hosts/h/main.cpp": '#include <webapi/Public.h>\n#include <seam.h>\n',
 }
 
 BAD = {
@@ -32,6 +32,7 @@ BAD = {
     "the reference platform includes the framework": ("platform/reference/zovacgi/R.cpp", '#include "web/A.h"'),
     "the reference platform includes public headers": ("platform/reference/zovacgi/R.h", "#include <webapi/Public.h>"),
     "a public header includes the inside": ("include/webapi/Public.h", '#include "web/A.h"'),
+    "a host includes the reference platform": ("hosts/h/main.cpp", '#include "zovacgi/R.h"'),
     "a host includes the inside": ("hosts/h/main.cpp", '#include "../../src/web/A.h"'),
 }
 

@@ -6,6 +6,7 @@
 #include <webapi/APITable.h>
 #include <webapi/Json.h>
 
+#include <fcntl.h>
 #include <signal.h>
 
 #include <iostream>
@@ -33,6 +34,48 @@ void Wait(ZOVA::APIRequest*, ZOVA::APIResponse* response) {
 
 void Die(ZOVA::APIRequest*, ZOVA::APIResponse*) {
     kill(getpid(), SIGKILL);
+}
+
+/** Which process runs the call, and in whose name. */
+void TellPlace(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
+    Json::Value place = probe::ProcessState();
+    place["process"] = getpid();
+    place["parent"] = getppid();
+    place["in_daemon"] = getenv("in_zovaapid") != nullptr;
+    place["login"] = request->GetLoginUserName();
+    place["admin"] = request->IsAdmin();
+    place["authorized"] = request->IsAuthorized();
+    char input[64] = "";
+    char output[64] = "";
+    place["streams"] = readlink("/proc/self/fd/0", input, sizeof(input) - 1) > 0 &&
+                               readlink("/proc/self/fd/1", output, sizeof(output) - 1) > 0
+                           ? std::string(input) + " " + output
+                           : "";
+    response->SetSuccess(place);
+}
+
+/** Makes the file "begun" and waits until the file "go" is there; both are paths. */
+void Hold(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
+    const std::string begun = Json::asString(request->GetParam("begun", ""));
+    const std::string go = Json::asString(request->GetParam("go", ""));
+    const int file = open(begun.c_str(), O_WRONLY | O_CREAT | O_CLOEXEC, 0600);
+    if (file < 0) {
+        response->SetError(1003, Json::Value());
+        return;
+    }
+    close(file);
+    for (int tries = 0; tries < 60000; ++tries) {
+        if (access(go.c_str(), F_OK) == 0) {
+            response->SetSuccess(Json::Value("held"));
+            return;
+        }
+        usleep(1000);
+    }
+    response->SetError(1004, Json::Value());
+}
+
+void AnswerLarge(ZOVA::APIRequest*, ZOVA::APIResponse* response) {
+    response->SetSuccess(Json::Value(std::string(300000, 'x')));
 }
 
 void Throw(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
@@ -100,6 +143,7 @@ bool ThrowInACheck(ZOVA::APIRequest*, ZOVA::APIResponse*) {
 }
 
 constexpr const char* kAPI = "ZOVA.Test.Probe";
+constexpr const char* kDaemonAPI = "ZOVA.Test.Probe.Daemon";
 
 const ZOVA::_tag_API_TABLE kTable[] = {
     {kAPI, 1, "granted", Tell},
@@ -118,6 +162,12 @@ const ZOVA::_tag_API_TABLE kTable[] = {
     {kAPI, 1, "write_lasting", Write},
     {kAPI, 1, "answer_long", AnswerLong},
     {kAPI, 1, "start_task", StartTask},
+    {kDaemonAPI, 1, "place", TellPlace},
+    {kDaemonAPI, 1, "as_nobody", TellPlace},
+    {kDaemonAPI, 1, "kept", TellPlace},
+    {kDaemonAPI, 1, "hold", Hold},
+    {kDaemonAPI, 1, "large", AnswerLarge},
+    {kDaemonAPI, 1, "dies", Die},
     {nullptr, 0, nullptr, nullptr},
 };
 

@@ -211,12 +211,4 @@ TEST_F(UpdateTimeoutTest, ARefusedUpdateOrRecordIsFalse) {
     EXPECT_EQ(platform.CountOf("ZovaCgiFree"), 3);
 }
 
-// ---- bearer tokens ----
-
-TEST_F(APIAuthTest, ACallCarriesNoBearerToken) {
-    request.InitEnv(J(R"({"HTTP_AUTHORIZATION": "Bearer x"})"));
-    EXPECT_FALSE(APIAuth::CheckAccessToken(&request));
-    EXPECT_EQ(request.GetAuthResult(), -4);
-}
-
 }  // namespace

@@ -1,6 +1,6 @@
 #pragma once
 
-// The login operations that this package imports from libzovacgi.so.6.
+// The login operations that the packages import from libzovacgi.so.6.
 
 extern "C" {
 

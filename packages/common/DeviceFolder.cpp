@@ -1,0 +1,9 @@
+#include "DeviceFolder.h"
+
+namespace package {
+
+const char* DeviceFolder() {
+    return "/etc/zova";
+}
+
+}  // namespace package
