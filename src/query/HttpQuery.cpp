@@ -80,7 +80,7 @@ bool MakeList(const CurlFunctions& curl, const std::string& lines, curl_slist*& 
 class Transfer {
 public:
     explicit Transfer(const CurlFunctions& functions)
-        : curl(functions), handle(functions.easyInit(), functions.easyCleanup), list(nullptr, functions.slistFreeAll) {}
+        : curl(functions), list(nullptr, functions.slistFreeAll), handle(functions.easyInit(), functions.easyCleanup) {}
 
     bool IsOpen() const { return handle != nullptr; }
 
@@ -123,8 +123,8 @@ private:
     }
 
     const CurlFunctions& curl;
-    std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> handle;
     std::unique_ptr<curl_slist, decltype(&curl_slist_free_all)> list;
+    std::unique_ptr<CURL, decltype(&curl_easy_cleanup)> handle;
 };
 
 }  // namespace
