@@ -95,6 +95,23 @@ TEST_F(ExecTest, ANullPointerIsAnEmptyText) {
     }
 }
 
+TEST_F(ExecTest, ItsStepsCalledOneByOneGiveTheSameResultWithoutAFork) {
+    const ExecParam bad;
+    ExecHandler refused(bad);
+    EXPECT_TRUE(refused.GetResult().isNull()) << "before anything has run";
+    EXPECT_FALSE(refused.CheckParams());
+    EXPECT_JSON(refused.GetResult(), kBadRequest);
+    ExpectLog(LOG_ERR, "missing parameter.", "ExecHandler.cpp");
+
+    const ExecParam good = Param("local", "succeed");
+    ExecHandler handler(good);
+    ASSERT_TRUE(handler.CheckParams());
+    handler.PrepareReq();
+    handler.Run(true);
+    EXPECT_JSON(handler.GetResult(), R"({"success": true, "httpd_restart": false})");
+    EXPECT_EQ(Forks(), 0);
+}
+
 // ---- where it runs ----
 
 TEST_F(ExecTest, AMethodThatGivesItsIdentityBackRunsInThisProcess) {
