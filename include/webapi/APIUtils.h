@@ -8,8 +8,8 @@
 
 /**
  * Queries from one part of the system to an API of the system or to an outside server, without a client in between, and
- * two helpers beside them. Every failure is a false result with a line in the log unless said otherwise; no function
- * throws. A query blocks for as long as the other side takes, within the limits stated.
+ * two small functions beside them. Every failure is a false result with a line in the log unless said otherwise; no
+ * function throws. A query blocks for as long as the other side takes, within the limits stated.
  */
 namespace ZOVA::APIUtils {
 
