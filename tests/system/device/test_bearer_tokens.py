@@ -366,6 +366,35 @@ class AnyServer(TokenCase):
         call(TOKEN, {"api": "ZOVA.Entry.Request", "version": 1, "method": "request", "compound": json.dumps([GET_USER] * 5)})
         self.assertEqual(3, len(server.asked))
 
+    def test_a_path_is_asked_at_the_devices_own_https_port(self):
+        server = self.scripted(oauth.answering(self.GOOD))
+        self.set_https_port(server.server_port)
+        for endpoint, asked in (("ask", "/ask"), ("/ask", "//ask")):
+            with self.subTest(endpoint=endpoint):
+                self.set_servers([server.record(endpoint=endpoint)])
+                self.assert_user(call(TOKEN))
+                self.assertEqual(asked, server.asked[-1][0])
+
+    def set_https_port(self, port):
+        """As the maker of a device does; what stood there before comes back."""
+        path = "/etc/zova/web-server.json"
+        before = None
+        if os.path.exists(path):
+            with open(path, encoding="utf-8") as file:
+                before = file.read()
+        settings = json.loads(before) if before else {}
+        with open(path, "w", encoding="utf-8") as file:
+            json.dump({**settings, "https_port": port}, file)
+        os.chmod(path, 0o600)
+
+        def put_back():
+            if before is None:
+                os.remove(path)
+            else:
+                with open(path, "w", encoding="utf-8") as file:
+                    file.write(before)
+        self.addCleanup(put_back)
+
     def test_an_api_of_the_device_can_stand_for_a_server(self):
         self.set_servers([{"enabled": True, "params": f"api={USER}&version=1&method=get&name={{access_token}}",
                            "expect": {"data": {"name": "{userName}", "shell": "{scope}"}}}])
