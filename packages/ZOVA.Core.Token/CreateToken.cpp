@@ -46,7 +46,7 @@ void Answer(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
         return;
     }
     const std::string user = request->GetLoginUserName();
-    const Json::Value list = apis.Get();
+    const Json::Value& list = apis.Get();
     Json::Value made;
     const int result = ZovaAccessTokenCreate(user.c_str(), label.c_str(), seconds, &list, &made);
     if (result == ZOVA_ACCESS_TOKEN_OK) {

@@ -38,7 +38,7 @@ bool ReadOwner(ZOVA::APIRequest* request, ZOVA::APIResponse* response, std::stri
         return false;
     }
     const std::string self = request->GetLoginUserName();
-    const std::string named = user.Get(self);
+    const std::string& named = user.Get(self);
     if (named != self && !request->IsAdmin()) {
         response->SetError(ZOVA::WEBAPI_ERR_NO_PERMISSION, Json::Value());
         return false;

@@ -487,13 +487,19 @@ TEST_F(AccessTokens, StayWithinTheirNumberWhenManyAreMadeAtOnce) {
     for (int at = 0; at < 90; ++at) {
         MakeToken();
     }
+    int start[2];
+    ASSERT_EQ(pipe(start), 0);
     std::vector<pid_t> makers;
     for (int at = 0; at < 20; ++at) {
         makers.push_back(fork());
         if (makers.back() == 0) {
-            _exit(Create("alice", kHour, kApis));
+            close(start[1]);
+            char byte;
+            _exit(read(start[0], &byte, 1) == 0 ? Create("alice", kHour, kApis) : -1);
         }
     }
+    close(start[1]);
+    close(start[0]);
     std::multiset<int> results;
     for (const pid_t maker : makers) {
         int status = -1;
