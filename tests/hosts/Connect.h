@@ -1,5 +1,6 @@
 #pragma once
 
+#include <gtest/gtest.h>
 #include <poll.h>
 #include <sys/socket.h>
 #include <sys/un.h>
@@ -25,18 +26,21 @@ inline host::Descriptor ConnectTo(const std::string& path) {
     return made;
 }
 
-/** What arrives until the end of the connection or, if given, of the line. */
+/** What arrives until the end of the connection or, if given, of the line. Fails the test if that end does not come. */
 inline std::string Read(int connection, bool onlyLine = false) {
     std::string text;
     pollfd wanted{connection, POLLIN, 0};
-    char byte;
-    while (poll(&wanted, 1, kPatience) > 0 && read(connection, &byte, 1) == 1) {
-        if (onlyLine && byte == '\n') {
+    for (;;) {
+        if (poll(&wanted, 1, kPatience) <= 0) {
+            ADD_FAILURE() << "the connection does not end; so far it brought: " << text;
+            return text;
+        }
+        char byte;
+        if (read(connection, &byte, 1) != 1 || (onlyLine && byte == '\n')) {
             return text;
         }
         text += byte;
     }
-    return text;
 }
 
 inline bool Write(int connection, const std::string& text) {
