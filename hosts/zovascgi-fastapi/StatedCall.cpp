@@ -1,5 +1,6 @@
 #include "StatedCall.h"
 
+#include <syslog.h>
 #include <webapi/ExecParam.h>
 #include <webapi/Json.h>
 
@@ -7,7 +8,10 @@ namespace host {
 
 std::optional<std::string> RunStatedCall(const std::string& message) {
     Json::Value description;
-    Json::fromString(description, message);
+    if (!Json::fromString(description, message) || description.type() != Json::objectValue) {
+        syslog(LOG_ERR, "a message of %zu bytes is no run description", message.size());
+        return std::nullopt;
+    }
     const ZOVA::ExecParam param(description);
     ZOVA::ExecHandler handler(param);
     if (handler.CheckParams()) {

@@ -360,15 +360,21 @@ class FastApi(DaemonCase):
     def test_without_api_method_or_runner_the_answer_is_101(self):
         whole = self.description("place", "alice")
         bad = {"success": False, "error": {"code": 101}}
-        rows = [{}, None, [], 5, "text", {"params": whole["params"]}, {"runner": whole["runner"]},
+        rows = [{}, {"params": whole["params"]}, {"runner": whole["runner"]},
                 {**whole, "runner": {"username": ""}}, {**whole, "runner": "alice"}, {**whole, "runner": {"uid": 1}},
                 {**whole, "params": {"version": 1, "method": "place"}}, {**whole, "params": {"api": API, "version": 1}},
                 {**whole, "params": [API]}]
         for row in rows:
             with self.subTest(row):
                 self.assertEqual(bad, self.ask(row))
-        self.assertEqual(bad, json.loads(daemon.ask(FAST_SOCKET, b"no JSON")))
-        self.assertEqual(bad, json.loads(daemon.ask(FAST_SOCKET, b"")))
+
+    def test_what_is_no_run_description_is_dropped_with_one_line_and_the_service_serves_on(self):
+        for text in (b"", b"no JSON", b"null", b"[]", b"5", b'"text"', b'{"params":', b"\0\0", b"[" * 300):
+            with self.subTest(text):
+                log = daemon.Log()
+                self.assertIsNone(daemon.ask(FAST_SOCKET, text))
+                self.assertEqual(1, len(log.wait_for("is no run description")))
+        self.assertTrue(self.ask(self.description("place", "alice"))["success"])
 
     def test_what_is_not_there_answers_as_for_a_client(self):
         rows = {102: {"api": "ZOVA.Nobody.Knows"}, 103: {"method": "unknown"}, 104: {"version": 7},
