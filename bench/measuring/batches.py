@@ -3,7 +3,6 @@
 import json
 import os
 import statistics
-import time
 import urllib.parse
 
 from . import handlers, instructions, system_calls
@@ -27,14 +26,6 @@ def batch(method, mode, size):
     return handlers.Call(handlers.HOST_FOLDER + "/front.cgi", "", form=form, expected=answer)
 
 
-def seconds_of(call):
-    begin = time.perf_counter()
-    output = call.run()
-    taken = time.perf_counter() - begin
-    call.check_output(output)
-    return taken
-
-
 def measure(folder):
     """By kind: seconds for each further entry in each round, system calls and, of those in process, instructions."""
     batches = {kind: (batch(method, mode, 1), batch(method, mode, size), size - 1)
@@ -42,7 +33,8 @@ def measure(folder):
     table = {kind: {"entries": further + 1, "seconds": []} for kind, (_, _, further) in batches.items()}
     for _ in range(ROUNDS):
         for kind, (short, long, further) in batches.items():
-            table[kind]["seconds"].append((seconds_of(long) - seconds_of(short)) / further)
+            taken = handlers.times_of(long).wall - handlers.times_of(short).wall
+            table[kind]["seconds"].append(taken / further)
     for kind, (short, long, further) in batches.items():
         table[kind]["system calls"] = (system_calls.total(long) - system_calls.total(short)) / further
         print(f"one entry of a batch, {kind}: {statistics.median(table[kind]['seconds']) * 1e6:.0f} microseconds, "

@@ -1,8 +1,11 @@
 """The measured processes: one call each of a bare program or of front.cgi, started as the web server starts it."""
 
+import collections
 import json
 import os
+import resource
 import subprocess
+import time
 import urllib.parse
 import urllib.request
 
@@ -37,10 +40,11 @@ class Call:
     """One process: its program, the path under which the web server offers it, what the client sends, and the answer
     that has to come; None for one that is another each time."""
 
-    def __init__(self, program, query, cookie=None, form="", expected=EXPECTED):
+    def __init__(self, program, query, cookie=None, form="", expected=EXPECTED, token=None):
         self.program = program
         self.query = query
         self.cookie = cookie
+        self.token = token
         self.form = form.encode()
         self.expected = expected
 
@@ -49,6 +53,8 @@ class Call:
                            SCRIPT_NAME=self.path(), REQUEST_URI=self.url())
         if self.cookie:
             environment["HTTP_COOKIE"] = self.cookie
+        if self.token:
+            environment["HTTP_AUTHORIZATION"] = "Bearer " + self.token
         if self.form:
             environment.update(REQUEST_METHOD="POST", CONTENT_TYPE="application/x-www-form-urlencoded",
                                CONTENT_LENGTH=str(len(self.form)))
@@ -82,9 +88,28 @@ class Call:
         return json.dumps(self.expected, sort_keys=True, separators=(",", ":"))
 
 
-def front(api, method, parameters, cookie=None, expected=EXPECTED):
+# Seconds.
+Times = collections.namedtuple("Times", ("wall", "processor"))
+
+
+def processor_time_of_children():
+    usage = resource.getrusage(resource.RUSAGE_CHILDREN)
+    return usage.ru_utime + usage.ru_stime
+
+
+def times_of(call):
+    """Wall-clock and processor time of the whole process, which has to give the right answer."""
+    processor = processor_time_of_children()
+    begin = time.perf_counter()
+    output = call.run()
+    times = Times(time.perf_counter() - begin, processor_time_of_children() - processor)
+    call.check_output(output)
+    return times
+
+
+def front(api, method, parameters, cookie=None, expected=EXPECTED, token=None):
     pairs = {"api": api, "version": 1, "method": method, **parameters}
-    return Call(HOST_FOLDER + "/front.cgi", urllib.parse.urlencode(pairs), cookie, expected=expected)
+    return Call(HOST_FOLDER + "/front.cgi", urllib.parse.urlencode(pairs), cookie, expected=expected, token=token)
 
 
 def session_cookie(session):
