@@ -34,6 +34,8 @@ constexpr const char* kNewDeviceInformation = ZOVA_REFERENCE_ROOT "/etc/.zovainf
 /** In a folder that only root can enter, so that nobody else can hold the lock. */
 constexpr const char* kDeviceInformationLock = ZOVA_REFERENCE_ROOT "/etc/zova/.information-lock";
 constexpr const char* kAccessTokenDirectory = ZOVA_REFERENCE_ROOT "/var/lib/zova/access-tokens";
+/** The system's table of MIME types, of the Debian package media-types. */
+constexpr const char* kMimeTypes = ZOVA_REFERENCE_ROOT "/etc/mime.types";
 constexpr const char* kGroupDirectory = ZOVA_REFERENCE_ROOT "/var/lib/zova/groups";
 // Null: wherever the system keeps its PAM services.
 constexpr const char* kPamDirectory = sizeof(ZOVA_REFERENCE_ROOT) > 1 ? ZOVA_REFERENCE_ROOT "/etc/pam.d" : nullptr;
