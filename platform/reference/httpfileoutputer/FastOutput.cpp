@@ -8,6 +8,7 @@
 #include <optional>
 
 #include "Seam.h"
+#include "common/ControlBytes.h"
 #include "common/DeviceInformation.h"
 #include "common/Utf8.h"
 #include "httpfileoutputer/PercentText.h"
@@ -55,12 +56,18 @@ bool OnlyRootWrites(const struct stat& status) {
     return status.st_uid == 0 && (status.st_mode & 022) == 0;
 }
 
-/** Whether every folder on the way, and the file, can be changed by root alone. */
+/** In a folder like /tmp, in which each may change their own only, what is root's stays as it is. */
+bool KeepsWhatIsRoots(const struct stat& folder) {
+    return S_ISDIR(folder.st_mode) && folder.st_uid == 0 &&
+           ((folder.st_mode & 022) == 0 || (folder.st_mode & S_ISVTX) != 0);
+}
+
+/** Whether root alone can change which file the path leads to, and the file itself. */
 bool OnlyRootDecides(const std::string& path, const struct stat& file) {
     struct stat status;
     for (size_t slash = 0; slash != std::string::npos; slash = path.find('/', slash + 1)) {
         const std::string folder = slash == 0 ? "/" : path.substr(0, slash);
-        if (lstat(folder.c_str(), &status) != 0 || !S_ISDIR(status.st_mode) || !OnlyRootWrites(status)) {
+        if (lstat(folder.c_str(), &status) != 0 || !KeepsWhatIsRoots(status)) {
             return false;
         }
     }
@@ -86,8 +93,9 @@ std::string FastOutputLine(int file) {
     }
     struct stat status;
     const std::string path = PathOf(file);
-    // Web servers refuse names that are no UTF-8.
-    if (fstat(file, &status) != 0 || !IsUtf8(path) || path.empty() || !OnlyRootDecides(path, status)) {
+    // Web servers refuse names that are no UTF-8, and look for another file where a name holds control bytes.
+    if (path.empty() || !IsUtf8(path) || HasControlByte(path) || fstat(file, &status) != 0 ||
+        !OnlyRootDecides(path, status)) {
         return "";
     }
     const FastOutput& device = DeviceFastOutput();
