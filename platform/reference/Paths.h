@@ -18,6 +18,7 @@ extern const char kEnvelopeKey[];
 extern const char kDeviceSecret[];
 extern const char kAppPrivileges[];
 extern const char kWebServer[];
+extern const char kVolumes[];
 
 extern const char kDeviceInformation[];
 /** What is to become the file above. One name for all writers: the next of them removes what a killed one left. */
@@ -25,7 +26,11 @@ extern const char kNewDeviceInformation[];
 /** In a folder that only root can enter, so that nobody else can hold the lock. */
 extern const char kDeviceInformationLock[];
 extern const char kAccessTokenDirectory[];
+/** The system's table of MIME types, of the Debian package media-types. */
+extern const char kMimeTypes[];
 extern const char kGroupDirectory[];
+extern const char kSharingDirectory[];
+extern const char kSharingDatabase[];
 /** Null: wherever the system keeps its PAM services. */
 extern const char* const kPamDirectory;
 
@@ -33,5 +38,6 @@ extern const char* const kPamDirectory;
 extern const char kModuleDirectory[];
 constexpr const char* kCryptoModule = "zova-crypto.so";
 constexpr const char* kLoginModule = "zova-login.so";
+constexpr const char* kSqliteModule = "zova-sqlite.so";
 
 }  // namespace reference::paths

@@ -10,6 +10,7 @@
 #include <string>
 
 #pragma GCC visibility push(default)
+#include "httpfileoutputer.h"
 #include "taskmanager.h"
 #include "webapiutil.h"
 #include "zovaaccesstoken.h"

@@ -1,6 +1,7 @@
 #include <cstdio>
 #include <string>
 
+#include "response/HeaderLine.h"
 #include "webapi/APIResponse.h"
 #include "webapi/Json.h"
 #include "webapi/WebEntry.h"
@@ -15,22 +16,6 @@ constexpr const char* kFixedLines =
     "Cache-Control: max-age=0, no-cache, no-store, must-revalidate\r\n"
     "Pragma: no-cache\r\n"
     "Expires: 0\r\n";
-
-/** Appends text in which no byte can end the header line. */
-void AppendHeaderText(std::string& block, const std::string& text) {
-    for (char c : text) {
-        block += c == '\r' || c == '\n' || c == '\0' ? ' ' : c;
-    }
-}
-
-void AppendHeaderLine(std::string& block, const std::string& name, const Json::Value& value) {
-    if (value.isString()) {
-        AppendHeaderText(block, name);
-        block += ": ";
-        AppendHeaderText(block, Json::asString(value));
-        block += "\r\n";
-    }
-}
 
 void Write(const std::string& text) {
     fwrite(text.data(), 1, text.size(), stdout);

@@ -107,6 +107,8 @@ public:
     /** How many more times a forked child that asks finds its parent, a process of root, alive. */
     int parentPolls = 0;
     int serverRestarts = 0;
+    /** Whether the web server is told to send files itself. */
+    bool fastOutput = true;
     /** Seconds since the epoch; below 0: the real clock. */
     long long clock = -1;
     /** Enciphered text to clear text, for lines, envelopes and AES (there as key, NUL-free blank, cipher text). */

@@ -36,4 +36,12 @@ std::string DeviceInformation::TrustedProxies() const {
     return std::string(FindKeyValue(text, "trusted_proxies").value_or(""));
 }
 
+std::string DeviceInformation::FastDownload() const {
+    return std::string(FindKeyValue(text, "fast_download").value_or(""));
+}
+
+std::string DeviceInformation::FastDownloadLocation() const {
+    return std::string(FindKeyValue(text, "fast_download_location").value_or(""));
+}
+
 }  // namespace reference

@@ -8,7 +8,7 @@ namespace reference {
 constexpr int kDefaultIdleMinutes = 15;
 constexpr int kLongestIdleMinutes = 1440;
 
-/** The login settings of the device information file, read anew by each object. A bad value counts as absent. */
+/** The settings of the device information file, read anew by each object. A bad value counts as absent. */
 class DeviceInformation {
 public:
     DeviceInformation();
@@ -19,6 +19,10 @@ public:
     bool SkipsAddressCheck() const;
     /** "trusted_proxies": addresses and networks, separated by commas. */
     std::string TrustedProxies() const;
+    /** "fast_download": the header by which the web server is told to send a file. */
+    std::string FastDownload() const;
+    /** "fast_download_location": in front of a file's path in that header. */
+    std::string FastDownloadLocation() const;
 
 private:
     std::string text;

@@ -92,10 +92,10 @@ class HostProcess(device.DeviceTestCase):
 
 class Headers(device.DeviceTestCase):
     def test_the_header_block_comes_through_in_its_order(self):
-        answer = raw_exchange(b"GET /webapi/front.cgi?api=ZOVA.Core.User&version=1&method=get HTTP/1.1\r\n"
+        answer = raw_exchange(b"GET /webapi/front.cgi?api=ZOVA.Core.User&version=1&method=get HTTP/1.0\r\n"
                               b"Host: device\r\nConnection: close\r\n\r\n")
         block, body = answer.split(b"\r\n\r\n", 1)
-        own = (b"HTTP/1.1", b"Connection:", b"Content-Length:", b"Date:", b"Server:")
+        own = (b"HTTP/1.0", b"Connection:", b"Content-Length:", b"Date:", b"Server:")
         lines = [line for line in block.split(b"\r\n") if not line.startswith(own)]
         self.assertEqual([
             b'Content-type: application/json; charset="UTF-8"', b"x-request-error: unauth",
@@ -157,7 +157,7 @@ class Parallel(device.DeviceTestCase):
         for number in range(40):
             name = ("alice", "admin")[number % 2]
             connection = socket.create_connection((url.hostname, url.port), timeout=device.TIME_LIMIT)
-            connection.sendall(f"GET {url.path}?api=ZOVA.Core.User&version=1&method=get HTTP/1.1\r\nHost: device\r\n"
+            connection.sendall(f"GET {url.path}?api=ZOVA.Core.User&version=1&method=get HTTP/1.0\r\nHost: device\r\n"
                                f"Cookie: id={clients[name].cookies['id']}\r\nConnection: close\r\n\r\n".encode())
             connections.append((name, connection))
         for name, connection in connections:

@@ -12,6 +12,7 @@
 #include <iostream>
 #include <stdexcept>
 
+#include "ProbeDownload.h"
 #include "ProcessState.h"
 
 namespace {
@@ -144,6 +145,7 @@ bool ThrowInACheck(ZOVA::APIRequest*, ZOVA::APIResponse*) {
 
 constexpr const char* kAPI = "ZOVA.Test.Probe";
 constexpr const char* kDaemonAPI = "ZOVA.Test.Probe.Daemon";
+constexpr const char* kDownloadAPI = "ZOVA.Test.Probe.Download";
 
 const ZOVA::_tag_API_TABLE kTable[] = {
     {kAPI, 1, "granted", Tell},
@@ -168,6 +170,9 @@ const ZOVA::_tag_API_TABLE kTable[] = {
     {kDaemonAPI, 1, "hold", Hold},
     {kDaemonAPI, 1, "large", AnswerLarge},
     {kDaemonAPI, 1, "dies", Die},
+    {kDownloadAPI, 1, "path", probe::SendPath},
+    {kDownloadAPI, 1, "stream", probe::SendStream},
+    {kDownloadAPI, 1, "pipe", probe::SendPipe},
     {nullptr, 0, nullptr, nullptr},
 };
 
