@@ -70,7 +70,8 @@ public:
     void InitEnv(const Json::Value& env);
     /**
      * Adds parameters from the members "getParam" and then "postParam" of `init`, so that the latter win. With
-     * `clear` all earlier parameters go first. The members "api", "version" and "method" name the call from then on.
+     * `clear` all earlier parameters go first. Enciphered members of either are deciphered before; what cannot be
+     * deciphered is left out, and the rest is taken. "api", "version" and "method" name the call from then on.
      */
     void InitParam(const Json::Value& init, bool clear);
     /** Replaces the description of the called API; anything but a non-empty object leaves none. */
@@ -163,6 +164,29 @@ public:
     std::string GetURLPath(const std::string& fallback);
     /** What stands behind the last "/" of the path, possibly nothing. */
     std::string GetURLName(const std::string& fallback);
+
+    // ---- the client's device, told once by its headers; any client can claim any of these ----
+
+    /** A mobile device whose user did not ask for the desktop view (the cookie "forceDesktop" is a number but 0). */
+    bool IsMobile();
+    /** A phone, tablet or the like. */
+    bool IsMobileDevice();
+    /** An iPhone or iPod; true for an iPad as well. */
+    bool IsIPhone();
+    /** Android that does not name one of the families of Apple. */
+    bool IsAndroid();
+    /** A mobile device with a browser of Microsoft. */
+    bool IsIEMobile();
+    /** An iPad that says so; one that asks for desktop pages calls itself a Mac. */
+    bool IsIPad();
+    /** A PlayBook tablet. */
+    bool IsPlayBook();
+    /** A BlackBerry with a WebKit browser. */
+    bool IsBlackBerry6();
+    /** A browser that names WebKit, mobile or not; nearly all do, for compatibility. */
+    bool IsWebKit();
+    /** One of the device families above, with WebKit: it can run the web application. */
+    bool IsSupportWebApp();
 
     // ---- who calls ----
 

@@ -1,8 +1,17 @@
 #pragma once
 
-// libzovacore.so.6: files, locks, processes, configuration.
+// libzovacore.so.6: files, locks, processes, configuration, texts.
+
+#include <cstddef>
 
 extern "C" {
+
+/** Makes the capital letters A to Z of the text small, in place. `size` counts the NUL at its end; the others are 0. */
+void QLIBCStrCaseLower(char* text, int unused, int unusedToo, std::size_t size);
+/** Not 0 if the text can be the name of a host. */
+int BlQLIBIsHostname(const char* text);
+/** Not 0 if the text can be the name of a domain. */
+int BlQLIBIsDomain(const char* text);
 
 /** 1 if the path names something that exists. */
 int QLIBCFileExist(const char* path);

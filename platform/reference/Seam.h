@@ -21,6 +21,7 @@
 #include "zovacredentials.h"
 #include "zovadaemon.h"
 #include "zovalogin.h"
+#include "zovanetsdk.h"
 #include "zovasdk.h"
 #include "zovasharing.h"
 #include "zovatokens.h"

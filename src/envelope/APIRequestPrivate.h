@@ -48,10 +48,21 @@ public:
     bool ParseHostAndPort();
     bool ParsePathAndName();
 
+    /** Classifies the client by its headers, once. */
+    void InitUA();
+    /** A flag of the section "userAgent", after `InitUA`; false where there is none. */
+    bool UserAgentFlag(const char* key);
+
     void InitSharing();
 
-    /** Deciphers what is enciphered in a parameter object, in place. */
+    /**
+     * Deciphers a parameter object in place: its cipher text, then its AES pair, then the object "webapi" in it in the
+     * same way, at most `Json::kMaximumDepth` levels down. A value that is no object holds nothing enciphered.
+     * @return false at the first that cannot be deciphered; what was taken out by then stays out. Logs nothing.
+     */
     bool DecryptParam(Json::Value& params);
+    /** The AES pair of a parameter object, in place, as `DecipherAES`. */
+    bool DecryptAESParam(Json::Value& params);
 
     unsigned int GetLoginUID();
 

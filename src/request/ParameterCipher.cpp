@@ -22,6 +22,13 @@ std::string TakeText(Json::Value& object, const char* name) {
     return text;
 }
 
+/** What is enciphered in the object itself. */
+bool DecipherObject(Json::Value& object) {
+    return (!Json::hasMember(object, kEnvelopeCipherTextKey) ||
+            DecipherEnvelope(TakeText(object, kEnvelopeCipherTextKey), object)) &&
+           DecipherAES(object);
+}
+
 }  // namespace
 
 bool DecipherAES(Json::Value& params) {
@@ -45,8 +52,24 @@ bool DecipherEnvelope(const std::string& cipherText, Json::Value& out) {
     return ZovaCgiDecryptParam(text.data()) != 0 && WebAPIUtil::strPairToJsonObj(text.data(), out, true, true);
 }
 
-bool APIRequestPrivate::DecryptParam(Json::Value&) {
-    return true;
+bool APIRequestPrivate::DecryptParam(Json::Value& params) {
+    Json::Value* object = &params;
+    // A deciphered text may bring an envelope that nests as deep as a document may, and so on: the way down has an end
+    // of its own.
+    for (int level = 0; level <= Json::kMaximumDepth; ++level) {
+        if (!DecipherObject(*object)) {
+            return false;
+        }
+        if (!Json::hasMember(*object, kEnvelopeKey)) {
+            return true;
+        }
+        object = &(*object)[kEnvelopeKey];
+    }
+    return false;
+}
+
+bool APIRequestPrivate::DecryptAESParam(Json::Value& params) {
+    return DecipherAES(params);
 }
 
 }  // namespace ZOVA

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "base/DecimalText.h"
+#include "base/FreeDeleter.h"
 #include "base/Log.h"
 #include "base/Printable.h"
 #include "base/UniqueFd.h"
@@ -25,10 +26,6 @@ namespace ZOVA {
 namespace {
 
 constexpr int kPost = 2;
-
-struct FreeDeleter {
-    void operator()(void* memory) const { free(memory); }
-};
 
 /** A claim, not a size: anything but a decimal number that fits an int is 0. */
 int ContentLength(const APIRequest& request) {
@@ -91,7 +88,7 @@ bool WebEntry::InitPostParam(Json::Value& out) {
             return false;
         }
         // Memory that is only claimed is never touched, so a body shorter than its claim costs what it is.
-        const std::unique_ptr<char, FreeDeleter> body(
+        const std::unique_ptr<char, base::FreeDeleter> body(
             static_cast<char*>(calloc(static_cast<std::size_t>(length) + 1, 1)));
         if (!body) {
             return false;

@@ -93,6 +93,10 @@ public:
     std::map<std::string, std::string> userPreferenceDirs;
     std::map<std::string, std::string> groupPreferenceDirs;
     bool confined = false;
+    /** What the system takes for the name of a host, of a domain, and for an address, with its family. */
+    std::set<std::string> hostNames;
+    std::set<std::string> domainNames;
+    std::map<std::string, int> addressTypes;
     BreakCredentials breakCredentials = BreakCredentials::kNever;
     /** Files that `QLIBCFileExist`, `ReadJsonFile` and `glob` see, by path. */
     std::map<std::string, std::string> files;

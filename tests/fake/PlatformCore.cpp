@@ -1,5 +1,6 @@
 // libzovacore.so.6 on the fake platform.
 
+#include <cctype>
 #include <cerrno>
 
 #include "FakePlatform.h"
@@ -15,6 +16,26 @@ constexpr int kChildId = 77002;
 }  // namespace
 
 extern "C" {
+
+void QLIBCStrCaseLower(char* text, int first, int second, std::size_t size) {
+    FakePlatform::Required(__func__).Enter(
+        __func__, std::to_string(first) + ", " + std::to_string(second) + ", " + std::to_string(size), 0);
+    for (std::size_t at = 0; at < size; ++at) {
+        text[at] = static_cast<char>(tolower(static_cast<unsigned char>(text[at])));
+    }
+}
+
+int BlQLIBIsHostname(const char* text) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    platform.Enter(__func__, text, 0);
+    return static_cast<int>(platform.hostNames.count(text));
+}
+
+int BlQLIBIsDomain(const char* text) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    platform.Enter(__func__, text, 0);
+    return static_cast<int>(platform.domainNames.count(text));
+}
 
 int QLIBCFileExist(const char* path) {
     FakePlatform& platform = FakePlatform::Required(__func__);

@@ -1,4 +1,4 @@
-// The smaller closed libraries on the fake platform: sharing, tokens, ciphers, web server control.
+// The smaller closed libraries on the fake platform: addresses, sharing, tokens, ciphers, web server control.
 
 #include <cerrno>
 #include <cstring>
@@ -7,12 +7,20 @@
 #include "zovaaccesstoken.h"
 #include "zovacloudservice.h"
 #include "zovacredential.h"
+#include "zovanetsdk.h"
 #include "zovasharing.h"
 #include "zovaw3.h"
 
 using fake::FakePlatform;
 
 extern "C" {
+
+int ZOVANetGetAddrType(const char* text) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    platform.Enter(__func__, text, 0);
+    const auto found = platform.addressTypes.find(text);
+    return found == platform.addressTypes.end() ? 0 : found->second;
+}
 
 const char* const SZ_X_SHARING_HEADER = "HTTP_X_FAKE_SHARING";
 
