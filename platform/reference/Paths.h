@@ -28,6 +28,8 @@ constexpr const char* kDeviceSecret = ZOVA_REFERENCE_ROOT "/etc/zova/device-secr
 constexpr const char* kAppPrivileges = ZOVA_REFERENCE_ROOT "/etc/zova/app-privileges.json";
 constexpr const char* kWebServer = ZOVA_REFERENCE_ROOT "/etc/zova/web-server.json";
 
+constexpr const char* kVolumes = ZOVA_REFERENCE_ROOT "/etc/zova/volumes.json";
+
 constexpr const char* kDeviceInformation = ZOVA_REFERENCE_ROOT "/etc/zovainfo.conf";
 /** What is to become the file above. One name for all writers: the next of them removes what a killed one left. */
 constexpr const char* kNewDeviceInformation = ZOVA_REFERENCE_ROOT "/etc/.zovainfo.conf.new";
