@@ -4,15 +4,13 @@
 #include <sys/file.h>
 #include <sys/stat.h>
 
-#include <algorithm>
 #include <cerrno>
-#include <cstdlib>
 #include <utility>
-#include <vector>
 
 #include "common/Files.h"
 #include "common/Hex.h"
 #include "common/RandomBytes.h"
+#include "zovacgi/PublishedFiles.h"
 
 namespace reference {
 
@@ -20,37 +18,6 @@ namespace {
 
 constexpr std::string_view kPrefix = "zova-upload-";
 constexpr size_t kRandomBytes = 16;
-
-/** The files that this process has published. */
-class Published {
-public:
-    static Published& OfProcess() {
-        static Published files;
-        return files;
-    }
-
-    Published() : process(getpid()) {}
-    Published(const Published&) = delete;
-    Published& operator=(const Published&) = delete;
-
-    /** Removes each that is still where it was; a forked child ends without doing so. */
-    ~Published() {
-        for (const auto& [descriptor, path] : files) {
-            struct stat held;
-            struct stat named;
-            if (process == getpid() && fstat(descriptor.Get(), &held) == 0 && lstat(path.c_str(), &named) == 0 &&
-                held.st_dev == named.st_dev && held.st_ino == named.st_ino) {
-                unlink(path.c_str());
-            }
-        }
-    }
-
-    void Add(UniqueFd descriptor, const std::string& path) { files.emplace_back(std::move(descriptor), path); }
-
-private:
-    pid_t process;
-    std::vector<std::pair<UniqueFd, std::string>> files;
-};
 
 std::string RandomName() {
     char random[kRandomBytes];
@@ -112,7 +79,7 @@ std::string PartFile::Publish() {
         name = fresh;
     }
     const std::string path = folder->Path() + "/" + name;
-    Published::OfProcess().Add(std::move(descriptor), path);
+    KeepPublished(std::move(descriptor), path);
     name.clear();
     return path;
 }
