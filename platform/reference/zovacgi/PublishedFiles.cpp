@@ -15,22 +15,20 @@ namespace {
 struct Node {
     UniqueFd descriptor;
     std::string path;
+    pid_t process;
     Node* next;
 };
 
 /** A list that only grows, so that a signal handler can walk it at any moment. */
 std::atomic<Node*> published;
-pid_t publisher;
 
 void RemovePublished() {
-    if (publisher != getpid()) {
-        return;
-    }
+    const pid_t process = getpid();
     for (const Node* node = published; node != nullptr; node = node->next) {
         struct stat held;
         struct stat named;
-        if (fstat(node->descriptor.Get(), &held) == 0 && lstat(node->path.c_str(), &named) == 0 &&
-            held.st_dev == named.st_dev && held.st_ino == named.st_ino) {
+        if (node->process == process && fstat(node->descriptor.Get(), &held) == 0 &&
+            lstat(node->path.c_str(), &named) == 0 && held.st_dev == named.st_dev && held.st_ino == named.st_ino) {
             unlink(node->path.c_str());
         }
     }
@@ -46,7 +44,6 @@ void RemoveAndEnd(int number) {
 
 struct RemovalAtExit {
     RemovalAtExit() {
-        publisher = getpid();
         for (const int number : {SIGTERM, SIGINT, SIGHUP}) {
             struct sigaction before;
             if (sigaction(number, nullptr, &before) == 0 && before.sa_handler == SIG_DFL) {
@@ -63,7 +60,7 @@ struct RemovalAtExit {
 
 void KeepPublished(UniqueFd descriptor, const std::string& path) {
     static const RemovalAtExit removal;
-    published = new Node{std::move(descriptor), path, published};
+    published = new Node{std::move(descriptor), path, getpid(), published};
 }
 
 }  // namespace reference

@@ -50,6 +50,14 @@ def upload_error(response):
     return (answer["code"], answer["errors"]["upload_err"])
 
 
+def open_files(process):
+    """Paths of what the process holds open; nothing if it is gone."""
+    try:
+        return [os.readlink(f"/proc/{process}/fd/{number}") for number in os.listdir(f"/proc/{process}/fd")]
+    except OSError:
+        return []
+
+
 class BrokenOff:
     """An upload that announces more than it sends, on a connection that stays open."""
 
@@ -59,6 +67,16 @@ class BrokenOff:
         self.socket.sendall(
             f"POST {url.path}?{query(method)} HTTP/1.1\r\nHost: {url.netloc}\r\nContent-Length: {announced}\r\n"
             f"Content-Type: multipart/form-data; boundary={BOUNDARY}\r\n\r\n".encode() + sent)
+
+    def answer(self):
+        """What comes back, up to its body."""
+        data = b""
+        while b'"success"' not in data:
+            more = self.socket.recv(65536)
+            if not more:
+                break
+            data += more
+        return data
 
     def close(self):
         self.socket.close()
@@ -73,6 +91,13 @@ class UploadTestCase(probe.ProbeTestCase):
         device.wait_for(lambda: not device.hosts_running(), "the end of all host programs")
         self.assertEqual([], part_files())
         super().tearDown()
+
+    def set_volumes(self, volumes):
+        os.makedirs(os.path.dirname(VOLUMES), mode=0o700, exist_ok=True)
+        with open(VOLUMES, "w", encoding="utf-8") as table:
+            table.write(f'{{"volumes": {volumes}}}')
+        os.chmod(VOLUMES, 0o600)
+        self.addCleanup(os.unlink, VOLUMES)
 
 
 class Stored(UploadTestCase):
@@ -92,8 +117,8 @@ class Stored(UploadTestCase):
         self.assertEqual("field", told["params"]["late"])
 
     def test_the_fourth_field_comes_too_late_to_name_the_call(self):
-        self.assertEqual(101, post(None, form(("x", b""), ("api", probe.API.encode()), ("version", b"1"),
-                                              ("method", b"upload"))).code())
+        self.assertEqual(101, post(None, form(("a", b""), ("b", b""), ("c", b""), ("api", probe.API.encode()),
+                                              ("version", b"1"), ("method", b"upload"))).code())
 
     def test_an_empty_file_is_a_file_and_none_chosen_is_an_empty_field(self):
         told = post("upload", form(("file", "empty", b""), ("none", "", b""))).json()["data"]
@@ -120,7 +145,7 @@ class Stored(UploadTestCase):
         self.assertEqual(("/etc/shadow", {}), (told["params"]["file"], told["files"]))
 
     def test_the_method_can_keep_a_file_by_moving_it(self):
-        with tempfile.TemporaryDirectory(dir="/var/tmp") as folder:
+        with tempfile.TemporaryDirectory(dir="/tmp") as folder:
             os.chown(folder, NOBODY, -1)
             kept = folder + "/kept"
             self.assertTrue(post("upload", form(("keep", kept.encode()), ("file", "x", b"content")))
@@ -144,10 +169,7 @@ class Stored(UploadTestCase):
     def test_a_data_volume_comes_first_and_its_folder_becomes_sticky(self):
         os.makedirs("/run/probe-volume")
         self.addCleanup(subprocess.run, ["rm", "-r", "/run/probe-volume"], check=True)
-        with open(VOLUMES, "w", encoding="utf-8") as table:
-            table.write('{"volumes": ["/nowhere", "/run/probe-volume"]}')
-        os.chmod(VOLUMES, 0o600)
-        self.addCleanup(os.unlink, VOLUMES)
+        self.set_volumes('["/nowhere", "/run/probe-volume"]')
         file = post("upload", form(("file", "x", b"content"))).json()["data"]["files"]["file"]
         self.assertTrue(file["path"].startswith("/run/probe-volume/@tmp/zova-upload-"))
         self.assertEqual("content", file["text"])
@@ -171,7 +193,7 @@ class Large(UploadTestCase):
 
     def test_a_file_that_fits_nowhere_is_refused_before_it_is_sent(self):
         upload = BrokenOff("upload", head("file", "x"), announced=1 << 50)
-        self.assertIn(b'"upload_err":-2', upload.socket.recv(65536))
+        self.assertIn(b'"upload_err":-2', upload.answer())
         upload.close()
 
 
@@ -241,7 +263,7 @@ class Deferred(UploadTestCase):
 class BrokenOffUploads(UploadTestCase):
     def test_a_client_that_breaks_off_leaves_nothing(self):
         for method in ("upload", "upload_deferred"):
-            upload = BrokenOff(method, form(("one", "a", b"complete"))[:-22] + head("two", "b") + b"x" * 3_000_000)
+            upload = BrokenOff(method, form(("one", "a", b"complete"))[:-20] + head("two", "b") + b"x" * 3_000_000)
             device.wait_for(device.hosts_running, "the host program")
             upload.close()
             device.wait_for(lambda: not device.hosts_running(), "the end of the host program")
@@ -250,12 +272,23 @@ class BrokenOffUploads(UploadTestCase):
     def test_a_host_killed_while_it_reads_leaves_nothing(self):
         upload = BrokenOff("upload", head("file", "x") + b"x" * 3_000_000)
         host, = device.wait_for(device.hosts_running, "the host program")
-        device.wait_for(lambda: any("(deleted)" in os.readlink(f"/proc/{host}/fd/{fd}")
-                                    for fd in os.listdir(f"/proc/{host}/fd")), "its file")
+        device.wait_for(lambda: any("(deleted)" in path for path in open_files(host)), "its file")
         os.kill(host, signal.SIGKILL)
         device.wait_for(lambda: not device.hosts_running(), "the end of the host program")
         self.assertEqual([], part_files())
         upload.close()
+
+    def test_a_host_told_to_end_while_its_method_runs_takes_its_file_along(self):
+        with tempfile.TemporaryDirectory(dir="/run") as folder:
+            held = query("upload_held", begun=f"{folder}/begun", go=f"{folder}/go")
+            with subprocess.Popen(["curl", "--silent", "--form", "file=content;filename=x", f"{device.URL}?{held}"],
+                                  stdout=subprocess.DEVNULL):
+                device.wait_for(lambda: os.path.exists(f"{folder}/begun"), "the method")
+                host, = device.hosts_running()
+                self.assertEqual(1, len(part_files()))
+                os.kill(host, signal.SIGTERM)
+                device.wait_for(lambda: not device.hosts_running(), "the end of the host program")
+        self.assertEqual([], part_files())
 
     def test_what_a_killed_host_left_goes_with_the_next_upload_and_what_a_live_one_holds_stays(self):
         with tempfile.TemporaryDirectory(dir="/run") as folder:
@@ -286,20 +319,16 @@ class BrokenOffUploads(UploadTestCase):
         subprocess.run(["mount", "-t", "tmpfs", "-o", "size=16m", "tmpfs", "/run/probe-volume"], check=True)
         self.addCleanup(os.rmdir, "/run/probe-volume")
         self.addCleanup(subprocess.run, ["umount", "/run/probe-volume"], check=True)
-        with open(VOLUMES, "w", encoding="utf-8") as table:
-            table.write('{"volumes": ["/run/probe-volume"]}')
-        os.chmod(VOLUMES, 0o600)
-        self.addCleanup(os.unlink, VOLUMES)
+        self.set_volumes('["/run/probe-volume"]')
         body = form(("one", "x", b"content"), ("two", "y", b"y" * 8_000_000))
         # The room is taken after the host has looked for it.
         upload = BrokenOff("upload", body[:1000], announced=len(body))
-        device.wait_for(lambda: any("/run/probe-volume" in os.readlink(f"/proc/{host}/fd/{fd}")
-                                    for host in device.hosts_running() for fd in os.listdir(f"/proc/{host}/fd")),
-                        "the file")
+        device.wait_for(lambda: any("/run/probe-volume/@tmp/" in path for host in device.hosts_running()
+                                    for path in open_files(host)), "the file")
         with open("/run/probe-volume/other", "wb") as other:
             other.write(b"o" * 14_000_000)
         upload.socket.sendall(body[1000:])
-        self.assertIn(b'"upload_err":-2', upload.socket.recv(65536))
+        self.assertIn(b'"upload_err":-2', upload.answer())
         upload.close()
         self.assertEqual(["@tmp", "other"], sorted(os.listdir("/run/probe-volume")))
 

@@ -80,7 +80,7 @@ void TakeUpload(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
         status = upload.GetUploadParam(step["fields"]);
         step["status"] = status;
         if (status == 0) {
-            const std::string skip = Json::asString(step["fields"]["skip"]);
+            const std::string skip = Json::asString(Json::member(step["fields"], "skip"));
             Json::Value stored(Json::objectValue);
             status = skip.empty() ? upload.GetUploadFile(stored) : 0;
             for (const std::string& name : stored.getMemberNames()) {
