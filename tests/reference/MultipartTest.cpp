@@ -19,12 +19,14 @@ std::string Head(const std::string& parameters) {
     return "Content-Disposition: form-data; " + parameters + "\r\n\r\n";
 }
 
+const std::string kLine = "--b\r\n";
+
 std::string Field(const std::string& name, const std::string& value) {
-    return "--b\r\n" + Head("name=\"" + name + "\"") + value + "\r\n";
+    return kLine + Head("name=\"" + name + "\"") + value + "\r\n";
 }
 
 std::string File(const std::string& name, const std::string& fileName, const std::string& content) {
-    return "--b\r\n" + Head("name=\"" + name + "\"; filename=\"" + fileName + "\"") + content + "\r\n";
+    return kLine + Head("name=\"" + name + "\"; filename=\"" + fileName + "\"") + content + "\r\n";
 }
 
 /** What comes out of a body that is pushed in pieces of these lengths, the last one again and again. */
@@ -81,8 +83,8 @@ const std::vector<Row>& Bodies() {
         {"a field", Field("a", "1") + "--b--\r\n", "a=1|end"},
         {"a last line without its end", Field("a", "1") + "--b--", "a=1|end"},
         {"an empty field", Field("a", "") + "--b--\r\n", "a=|end"},
-        {"an empty field whose content has no line of its own", "--b\r\n" + Head("name=a") + "--b--", "a=|end"},
-        {"a content that nearly is such a field", "--b\r\n" + Head("name=a") + "--c\r\n--b--", "a=--c|end"},
+        {"an empty field whose content has no line of its own", kLine + Head("name=a") + "--b--", "a=|end"},
+        {"a content that nearly is such a field", kLine + Head("name=a") + "--c\r\n--b--", "a=--c|end"},
         {"a content that begins with a line end", Field("a", "\r\n1") + "--b--", "a=\r\n1|end"},
         {"a content that ends with line ends", Field("a", "1\r\n\r\n") + "--b--", "a=1\r\n\r\n|end"},
         {"two parts of one name", Field("a", "1") + Field("a", "2") + "--b--", "a=1|a=2|end"},
@@ -110,39 +112,37 @@ const std::vector<Row>& Bodies() {
          "Content-Transfer-Encoding: Binary\r\n\r\n1\r\n--b--",
          "a=1|end"},
         {"names with escapes",
-         "--b\r\n" + Head(R"(name="a%22%0D%0A\"\\\n"; filename="C:\dir\x; y=\"1\".txt")") + "1\r\n--b--",
+         kLine + Head(R"(name="a%22%0D%0A\"\\\n"; filename="C:\dir\x; y=\"1\".txt")") + "1\r\n--b--",
          "a\"\r\n\"\\\\n<C:\\dir\\x; y=\"1\".txt>1|end"},
         {"other percent signs stay", Field("100%25 %2", "1") + "--b--", "100%25 %2=1|end"},
         {"names beyond ASCII", File("größe", "😀/../x", "1") + "--b--", "größe<😀/../x>1|end"},
-        {"an encoded file name", "--b\r\n" + Head("name=f; filename*=UTF-8'de'%e2%82%ac%20x") + "1\r\n--b--",
+        {"an encoded file name", kLine + Head("name=f; filename*=UTF-8'de'%e2%82%ac%20x") + "1\r\n--b--",
          "f<€ x>1|end"},
         {"a plain file name beside an encoded one",
-         "--b\r\n" + Head("name=f; filename=plain; filename*=UTF-8''other") + "1\r\n--b--", "f<plain>1|end"},
+         kLine + Head("name=f; filename=plain; filename*=UTF-8''other") + "1\r\n--b--", "f<plain>1|end"},
 
         {"nothing", "", "more"},
         {"no last delimiter", Field("a", "1"), "more"},
-        {"a file that breaks off", "--b\r\n" + Head("name=f; filename=x") + "1234\r\n--", "f<x>1234more"},
+        {"a file that breaks off", kLine + Head("name=f; filename=x") + "1234\r\n--", "f<x>1234more"},
         {"lines that end in LF", "--b\nContent-Disposition: form-data; name=a\n\n1\n--b--\n", "malformed"},
         {"header lines that end in LF", "--b\r\nContent-Disposition: form-data; name=a\n\n1\r\n--b--", "malformed"},
-        {"a lone CR in a header line", "--b\r\nX: 1\r2\r\n" + Head("name=a") + "1\r\n--b--", "malformed"},
-        {"a zero byte in a header line", "--b\r\n" + Head(std::string("name=\"a\0b\"", 10)) + "1\r\n--b--",
-         "malformed"},
+        {"a lone CR in a header line", kLine + "X: 1\r2\r\n" + Head("name=a") + "1\r\n--b--", "malformed"},
+        {"a zero byte in a header line", kLine + Head(std::string("name=\"a\0b\"", 10)) + "1\r\n--b--", "malformed"},
         {"a part without header lines", "--b\r\n\r\n1\r\n--b--", "malformed"},
-        {"a part without a name", "--b\r\n" + Head("filename=x") + "1\r\n--b--", "malformed"},
+        {"a part without a name", kLine + Head("filename=x") + "1\r\n--b--", "malformed"},
         {"an empty name", Field("", "1") + "--b--", "malformed"},
         {"another disposition", "--b\r\nContent-Disposition: attachment; name=a\r\n\r\n1\r\n--b--", "malformed"},
-        {"two dispositions", "--b\r\nContent-Disposition: form-data; name=a\r\n" + Head("name=c") + "1\r\n--b--",
+        {"two dispositions", kLine + "Content-Disposition: form-data; name=a\r\n" + Head("name=c") + "1\r\n--b--",
          "malformed"},
-        {"two names", "--b\r\n" + Head("name=a; name=c") + "1\r\n--b--", "malformed"},
-        {"a quote that is not closed", "--b\r\n" + Head("name=\"a") + "1\r\n--b--", "malformed"},
-        {"text behind a quote", "--b\r\n" + Head("name=\"a\"c") + "1\r\n--b--", "malformed"},
+        {"two names", kLine + Head("name=a; name=c") + "1\r\n--b--", "malformed"},
+        {"a quote that is not closed", kLine + Head("name=\"a") + "1\r\n--b--", "malformed"},
+        {"text behind a quote", kLine + Head("name=\"a\"c") + "1\r\n--b--", "malformed"},
         {"a folded header line", "--b\r\nContent-Disposition: form-data;\r\n name=a\r\n\r\n1\r\n--b--", "malformed"},
-        {"a header line that is none", "--b\r\nhello\r\n" + Head("name=a") + "1\r\n--b--", "malformed"},
-        {"a transfer encoding", "--b\r\nContent-Transfer-Encoding: base64\r\n" + Head("name=a") + "MQ==\r\n--b--",
+        {"a header line that is none", kLine + "hello\r\n" + Head("name=a") + "1\r\n--b--", "malformed"},
+        {"a transfer encoding", kLine + "Content-Transfer-Encoding: base64\r\n" + Head("name=a") + "MQ==\r\n--b--",
          "malformed"},
-        {"an encoded name of another charset", "--b\r\n" + Head("name=f; filename*=latin1''x") + "1\r\n--b--",
-         "malformed"},
-        {"an encoded zero byte", "--b\r\n" + Head("name=f; filename*=utf-8''x%00y") + "1\r\n--b--", "malformed"},
+        {"an encoded name of another charset", kLine + Head("name=f; filename*=latin1''x") + "1\r\n--b--", "malformed"},
+        {"an encoded zero byte", kLine + Head("name=f; filename*=utf-8''x%00y") + "1\r\n--b--", "malformed"},
         {"a zero byte in a field", Field("a", std::string("1\0", 2)) + "--b--", "malformed"},
         {"a name that is too long", Field(std::string(64, 'n'), "1") + "--b--", "too large"},
         {"a file name that is too long", File("f", std::string(491, 'n'), "1") + "--b--", "too large"},
@@ -236,11 +236,11 @@ TEST(MultipartDecoder, LimitsNamesHeaderLinesAndValues) {
 
     const size_t fixed = Head("name=a").size() + std::string("X: \r\n").size();
     const auto padded = [&](size_t length) {
-        return "--b\r\nX: " + std::string(length - fixed, 'x') + "\r\n" + Head("name=a") + "1\r\n" + rest;
+        return kLine + "X: " + std::string(length - fixed, 'x') + "\r\n" + Head("name=a") + "1\r\n" + rest;
     };
     EXPECT_EQ(Decoded(padded(8192)), "a=1|end");
     EXPECT_EQ(Decoded(padded(8193)), "too large");
-    EXPECT_EQ(Decoded("--b\r\nX: " + std::string(1048576, 'x')), "too large");
+    EXPECT_EQ(Decoded(kLine + "X: " + std::string(1048576, 'x')), "too large");
 
     const std::string half(524288, 'v');
     EXPECT_EQ(Decoded(Field("a", half) + Field("c", half) + rest), "a=" + half + "|c=" + half + "|end");

@@ -54,6 +54,10 @@ protected:
         DeviceTest::SetUp();
         mkdir(folder.c_str(), 0777);
         ASSERT_EQ(chmod(folder.c_str(), 0777), 0);
+        RemoveFiles();
+    }
+
+    void RemoveFiles() const {
         for (const std::string& name : Files()) {
             unlink((folder + "/" + name).c_str());
         }
@@ -128,6 +132,7 @@ TEST_F(Upload, ReadsNoMoreThanWasAnnouncedAndMissesWhatIsNotThere) {
             return "";
         });
     }
+    RemoveFiles();
     InUpload(kGood.substr(0, kGood.size() - 10), std::to_string(kGood.size()), [&]() -> std::string {
         Hash params;
         Hash files;
@@ -314,9 +319,7 @@ TEST_F(Upload, AProcessThatEndsTakesItsFilesAlongUnlessTheyWereMoved) {
         const std::vector<std::string> names = Files();
         EXPECT_EQ(names.size(), 2u);
         EXPECT_EQ(std::count(names.begin(), names.end(), "moved"), 1);
-        for (const std::string& name : names) {
-            unlink((folder + "/" + name).c_str());
-        }
+        RemoveFiles();
     }
 }
 

@@ -322,12 +322,13 @@ class BrokenOffUploads(UploadTestCase):
         self.set_volumes('["/run/probe-volume"]')
         body = form(("one", "x", b"content"), ("two", "y", b"y" * 8_000_000))
         # The room is taken after the host has looked for it.
-        upload = BrokenOff("upload", body[:1000], announced=len(body))
+        # More than the host takes at once, so that it has begun the file.
+        upload = BrokenOff("upload", body[:1_000_000], announced=len(body))
         device.wait_for(lambda: any("/run/probe-volume/@tmp/" in path for host in device.hosts_running()
                                     for path in open_files(host)), "the file")
         with open("/run/probe-volume/other", "wb") as other:
             other.write(b"o" * 14_000_000)
-        upload.socket.sendall(body[1000:])
+        upload.socket.sendall(body[1_000_000:])
         self.assertIn(b'"upload_err":-2', upload.answer())
         upload.close()
         self.assertEqual(["@tmp", "other"], sorted(os.listdir("/run/probe-volume")))
