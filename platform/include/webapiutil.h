@@ -6,6 +6,8 @@
 
 #include <string>
 
+struct ZovaSzHash;
+
 namespace ZOVA {
 
 class WebAPIUtil {
@@ -26,6 +28,9 @@ public:
      * @return false if `out` is neither an object nor null.
      */
     static bool strPairToJsonObj(const std::string& pairs, Json::Value& out, bool typed, bool decode);
+
+    /** Adds every pair of the hash to `out`, as texts. False if `hash` is null or `out` neither an object nor null. */
+    static bool SzHashToJsonObj(ZovaSzHash* hash, Json::Value& out);
 
     /** Reads a JSON file. False if it cannot be read or parsed; `out` is then left alone. */
     static bool ReadJsonFile(Json::Value& out, const char* path);

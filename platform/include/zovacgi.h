@@ -8,6 +8,7 @@ extern "C" {
 
 /** The CGI context record. All zero before `ZovaCgiInit`; `ZovaCgiFree` gives back what it holds. */
 struct ZovaCgi {
+    /** Receives form fields. Null until somebody allocates it. */
     ZovaSzHash* params;
     char* sessFile;
     char* sessDir;
@@ -39,6 +40,38 @@ enum ZovaCgiOption : int {
     ZOVA_CGI_OPTION_TIMEOUT = 10,
 };
 
+/** How an upload stands. */
+enum ZovaCgiUploadStatus : int {
+    /** The body goes on. */
+    ZOVA_UPLOAD_RUNNING = 0,
+    ZOVA_UPLOAD_COMPLETE = 1,
+    /** Not in the form that the content type announces. */
+    ZOVA_UPLOAD_MALFORMED = -1,
+    /** No folder with enough room, or the room ran out. */
+    ZOVA_UPLOAD_NO_ROOM = -2,
+    /** The body ends before it is complete. */
+    ZOVA_UPLOAD_CUT_OFF = -3,
+    /** A part file cannot be made or written. */
+    ZOVA_UPLOAD_NO_FILE = -4,
+    /** Too many parts, or a name, header block or value that is too long. */
+    ZOVA_UPLOAD_TOO_LARGE = -5,
+    ZOVA_UPLOAD_EMPTY = -6,
+    /** Neither multipart with a usable boundary nor a slice. */
+    ZOVA_UPLOAD_NO_UPLOAD = -7,
+    ZOVA_UPLOAD_NO_PART_REACHED = -8,
+    ZOVA_UPLOAD_NO_MEMORY = -9,
+};
+
+struct ZovaCgiUploadState {
+    /** Bytes of the body taken so far, and its length. */
+    unsigned long long readBytes;
+    unsigned long long totalBytes;
+    int status;
+};
+
+/** Told now and then how far an upload has come: bytes taken so far, length of the body. */
+using ZovaCgiUploadCallback = void (*)(unsigned long long, unsigned long long);
+
 /** Prepares the record for a web request: session directory, idle time, address check. 0 on success. */
 int ZovaCgiInit(const char* unused, ZovaCgi* cgi);
 /** Prepares the record without a web request. 0 on success. */
@@ -66,5 +99,34 @@ unsigned int ZovaCgiUIDGet(const char* sid);
 int ZovaCgiDecryptParam(char* text);
 /** Deciphers an enciphered parameter line in place, leaves a clear one alone. Null on failure, else `line`. */
 char* ZovaCgiDetectAndDecryptParamLine(char* line);
+
+// Uploads. The body of the process's request is read from standard input, by all of these from where the last of them
+// stopped; `boundary` receives the text that parts the body. Part files are regular files with mode 0600, owned by the
+// identity that the process has then, under names that nobody can guess; the client's file names are no part of them.
+
+/**
+ * Reads up to `count` form fields into the record's hash, and no byte beyond them; stops at a file part.
+ * @return the number of fields, negative on failure.
+ */
+int ZovaCgiLoadUploadNumParams(ZovaCgi* cgi, int count, ZovaCgiUploadCallback callback, ZovaCgiUploadState* state,
+                               char* boundary, int boundarySize);
+/**
+ * Reads form fields up to the next file part into the record's hash; a file part that nobody read is passed over.
+ * @param name receives the part's field, `value` the client's name of the file, both "" at the end of the body.
+ * @return the number of fields, negative on failure.
+ */
+int ZovaCgiLoadUploadParams(ZovaCgi* cgi, ZovaCgiUploadCallback callback, ZovaCgiUploadState* state, char* boundary,
+                            int boundarySize, char* name, int nameSize, char* value, int valueSize);
+/**
+ * Writes the file part that was reached into a new file in `dir`; its path stands in the record's hash under `name`.
+ * @return 1, negative on failure; no file is left then.
+ */
+int ZovaCgiLoadUploadFileToDir(ZovaCgi* cgi, const char* dir, ZovaCgiUploadCallback callback,
+                               ZovaCgiUploadState* state, char* boundary, char* name);
+/**
+ * Reads the rest of the body: form fields into `params`, and the paths of new files in `dir` into `files`.
+ * @return an upload status, 1 on success. Files of a body that failed stand in `files`, or are gone.
+ */
+int ZovaCgiLoadUploadAll(ZovaSzHash** params, ZovaSzHash** files, const char* dir, int unused);
 
 }  // extern "C"

@@ -12,6 +12,30 @@ void QLIBCStrCaseLower(char* text, int unused, int unusedToo, std::size_t size);
 int BlQLIBIsHostname(const char* text);
 /** Not 0 if the text can be the name of a domain. */
 int BlQLIBIsDomain(const char* text);
+struct ZovaSzPair {
+    char* key;
+    char* value;
+};
+
+/** A string hash: `count` pairs in hash order, which the hash owns. */
+struct ZovaSzHash {
+    unsigned int size;
+    unsigned int count;
+    ZovaSzPair* pairs;
+};
+
+/** An empty hash for about `size` pairs; null without memory. */
+ZovaSzHash* QLIBCSzHashAlloc(int size);
+/** Sets the value of a key, with copies of both; the hash may move. Negative without memory. */
+int QLIBCSzHashSetValue(ZovaSzHash** hash, const char* key, const char* value);
+void QLIBCHashRemoveAll(ZovaSzHash* hash);
+/** Frees the hash with its pairs; null is allowed. */
+void QLIBCSzHashFree(ZovaSzHash* hash);
+
+/** Stores the error code of this library, and where it was set; kept until the next is stored. */
+void QLIBCErrSetEx(int code, const char* file, int line);
+/** The code stored last, 0 before any. */
+int QLIBCErrGet();
 
 /** 1 if the path names something that exists. */
 int QLIBCFileExist(const char* path);

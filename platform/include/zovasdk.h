@@ -6,6 +6,19 @@
 
 extern "C" {
 
+struct ZovaVolumeInfo {
+    /** Mount path, without a slash at its end. */
+    char path[256];
+};
+
+/**
+ * Finds a data volume with `size` bytes free.
+ * @param id receives the volume's number.
+ * @param unused is 1.
+ * @return 1 if there is one.
+ */
+int VolumeAvailGet(unsigned long long size, ZovaVolumeInfo* info, int* id, int unused);
+
 /** Creates the directory with its parents and the given mode; -1 keeps the owner. Negative on failure. */
 int ZOVAFSMkdirP(const char* path, int unused, int keepMode, int uid, int gid, unsigned int mode);
 /** 0 on success; "system" is root. */

@@ -4,6 +4,7 @@
 #include "base/Printable.h"
 #include "dispatcher/DirectoryScope.h"
 #include "dispatcher/HatScope.h"
+#include "dispatcher/IdentityPlan.h"
 #include "dispatcher/IdentityScope.h"
 #include "dispatcher/NiceScope.h"
 #include "dispatcher/PermissionFrame.h"
@@ -19,15 +20,6 @@ namespace ZOVA {
 namespace {
 
 constexpr const char* kCountAttribute = "_collector_count_webapi";
-
-/** What the description says of the identity that a method runs under. */
-struct IdentityPlan {
-    bool grantByDefault = false;
-    bool grantByUser = false;
-    bool grantable = false;
-    std::string runAs;
-    std::string login;
-};
 
 void Answer(APIResponse& response, int code) {
     response.SetError(code, Json::Value());
@@ -94,28 +86,17 @@ bool TakeIdentity(const IdentityPlan& plan, IdentityScope& identity) {
             WEBAPI_LOG(LOG_ERR, "grantByUser: failed to get login username.");
             return false;
         }
-        if (!ResetIdentity(plan.login, plan.grantable)) {
+        if (!ResetIdentity(plan.User(), plan.grantable)) {
             WEBAPI_LOG(LOG_ERR, "grantByUser failed. [%m]");
             return false;
         }
         return true;
     }
-    if (!ResetIdentity(plan.runAs, plan.grantable)) {
+    if (!ResetIdentity(plan.User(), plan.grantable)) {
         WEBAPI_LOG(LOG_ERR, "grantable failed. [%m]");
         return false;
     }
     return true;
-}
-
-IdentityPlan PlanIdentity(const APIRequest& request, const Json::Value& attributes) {
-    IdentityPlan plan;
-    plan.grantByDefault = Json::asBool(Json::member(attributes, "grantByDefault"));
-    plan.grantByUser = Json::asBool(Json::member(attributes, "grantByUser"));
-    plan.grantable = plan.grantByDefault || Json::asBool(Json::member(attributes, "grantable"));
-    plan.runAs = Json::asString(Json::hasMember(attributes, "runAs") ? attributes["runAs"]
-                                                                     : request.GetAPIInfo("runAs", "system"));
-    plan.login = request.GetLoginUserName();
-    return plan;
 }
 
 /** From the check table to the method and back to the old identity. True if the method was called. */
@@ -139,7 +120,7 @@ bool CallMethod(const CallName& name, const Json::Value& attributes, const _tag_
     if (!identity.Save()) {
         return false;
     }
-    const IdentityPlan plan = PlanIdentity(*request, attributes);
+    const IdentityPlan plan = IdentityPlan::Of(*request, attributes);
     if (!TakeIdentity(plan, identity)) {
         return false;
     }

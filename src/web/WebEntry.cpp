@@ -22,6 +22,17 @@ std::string ProcessVariable(const char* name) {
     return value == nullptr ? "" : value;
 }
 
+class [[nodiscard]] RemovalAtEnd {
+public:
+    explicit RemovalAtEnd(WebEntry& entry) : owner(entry) {}
+    RemovalAtEnd(const RemovalAtEnd&) = delete;
+    RemovalAtEnd& operator=(const RemovalAtEnd&) = delete;
+    ~RemovalAtEnd() { owner.RemoveTemporaryUploadFile(); }
+
+private:
+    WebEntry& owner;
+};
+
 }  // namespace
 
 WebEntry::WebEntry() : tempUploadFiles(Json::arrayValue), cgi(new ZovaCgi{}), permCache(Json::objectValue) {
@@ -34,6 +45,8 @@ WebEntry::~WebEntry() {
 }
 
 void WebEntry::Run(const Json::Value&) {
+    // Also where an exception leaves: no file of an upload stays behind.
+    const RemovalAtEnd removal(*this);
     if (Initialize(Json::Value()) && SetProcessName(request, response)) {
         if (request->HasParam("relay_zn")) {
             ProcessRelay(request, response);
@@ -50,7 +63,6 @@ void WebEntry::Run(const Json::Value&) {
         response->SetCallbackFunc(RestartHttpd, nullptr);
     }
     HandleCallback(response);
-    RemoveTemporaryUploadFile();
 }
 
 bool WebEntry::Initialize(const Json::Value&) {

@@ -51,6 +51,21 @@ struct Connection {
     std::string request;
 };
 
+/** The upload that comes with the call, as the CGI library would read it. */
+struct FakeUpload {
+    using Pairs = std::vector<std::pair<std::string, std::string>>;
+
+    Pairs fields;
+    /** Field and path of each part file. */
+    Pairs files;
+    std::string boundary = "boundary";
+    std::string partName;
+    std::string partValue;
+    unsigned long long readBytes = 0;
+    unsigned long long totalBytes = 0;
+    int status = 1;
+};
+
 /** What `QLIBCProcFork` does: the code behind it runs as the parent, as the child, or sees a refusal. */
 enum class ForkAs { kParent, kChild, kRefused };
 
@@ -133,6 +148,16 @@ public:
     std::vector<HttpRequest> httpRequests;
     /** Handles and header lines of libcurl that nobody has given back. */
     int curlObjects = 0;
+
+    FakeUpload upload;
+    /** Hashes that nobody has given back. */
+    int openHashes = 0;
+    /** Free bytes of file systems by path; those of others cannot be told. */
+    std::map<std::string, unsigned long long> freeBytes;
+    /** Mount path of the data volume with room, "" if there is none. */
+    std::string volume;
+    /** Error codes that were stored. */
+    std::vector<int> coreErrors;
 
     FakeProcess process;
     ForkedChildren children;

@@ -6,6 +6,7 @@
 
 #include "FakePlatform.h"
 #include "zovacgi.h"
+#include "zovacore.h"
 
 using fake::FakePlatform;
 using fake::Session;
@@ -73,6 +74,7 @@ int ZovaCgiInitEx(ZovaCgi* cgi, int timeout, int flag, const char* users, const 
 
 void ZovaCgiFree(ZovaCgi* cgi) {
     FakePlatform::Required(__func__).Enter(__func__, "", 0);
+    QLIBCSzHashFree(cgi->params);
     free(cgi->sessFile);
     free(cgi->sessDir);
     delete static_cast<CgiState*>(cgi->state);

@@ -4,6 +4,7 @@
 #include <fnmatch.h>
 #include <glob.h>
 #include <sys/stat.h>
+#include <sys/statvfs.h>
 #include <unistd.h>
 
 #include <cerrno>
@@ -26,6 +27,8 @@ int __real_stat(const char*, struct stat*);
 int __real_rename(const char*, const char*);
 int __real_unlink(const char*);
 int __real_fchmod(int, mode_t);
+int __real_statvfs(const char*, struct statvfs*);
+int __real_lchown(const char*, uid_t, gid_t);
 ssize_t __real_write(int, const void*, size_t);
 size_t __real_fread(void*, size_t, size_t, FILE*);
 char* __real_realpath(const char*, char*);
@@ -120,6 +123,32 @@ FAKE_EXPORT int __wrap_fchmod(int fd, mode_t mode) {
         return -1;
     }
     return __real_fchmod(fd, mode);
+}
+
+FAKE_EXPORT int __wrap_statvfs(const char* path, struct statvfs* out) {
+    FakePlatform* platform = FakePlatform::Active();
+    if (platform == nullptr) {
+        return __real_statvfs(path, out);
+    }
+    const auto found = platform->freeBytes.find(path);
+    if (!platform->Enter("statvfs", path, EIO) || found == platform->freeBytes.end()) {
+        return -1;
+    }
+    *out = {};
+    // Blocks of one byte; another block size, and what root alone may use, are not what counts.
+    out->f_frsize = 1;
+    out->f_bfree = found->second;
+    out->f_bsize = 4096;
+    return 0;
+}
+
+/** Recorded only: the file of a path need not be there. */
+FAKE_EXPORT int __wrap_lchown(const char* path, uid_t uid, gid_t gid) {
+    FakePlatform* platform = FakePlatform::Active();
+    if (platform == nullptr) {
+        return __real_lchown(path, uid, gid);
+    }
+    return platform->Enter("lchown", std::string(path) + ", " + Shown(uid) + ", " + Shown(gid), EPERM) ? 0 : -1;
 }
 
 FAKE_EXPORT ssize_t __wrap_write(int fd, const void* bytes, size_t size) {

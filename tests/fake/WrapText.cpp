@@ -4,10 +4,11 @@
 
 #include "Wrap.h"
 #include "webapi/Json.h"
+#include "zovacore.h"
 
 using fake::FakePlatform;
 
-// The linker wraps C++ functions by their mangled names: these are WebAPIUtil::strPairToJsonObj and ReadJsonFile.
+// The linker wraps C++ functions by their mangled names: these are members of WebAPIUtil.
 
 #define PAIRS_NAME                            \
     "_ZN4ZOVA10WebAPIUtil16strPairToJsonObjE" \
@@ -15,6 +16,10 @@ using fake::FakePlatform;
     "traitsIcESaIcEEERN4Json5ValueEbb"
 #define READ_NAME "_ZN4ZOVA10WebAPIUtil12ReadJsonFileERN4Json5ValueEPKc"
 
+#define HASH_NAME "_ZN4ZOVA10WebAPIUtil15SzHashToJsonObjEP10ZovaSzHashRN4Json5ValueE"
+
+bool RealHash(ZovaSzHash* hash, Json::Value& out) __asm__("__real_" HASH_NAME);
+bool WrappedHash(ZovaSzHash* hash, Json::Value& out) __asm__("__wrap_" HASH_NAME);
 bool RealPairs(const std::string& pairs, Json::Value& out, bool typed, bool decode) __asm__("__real_" PAIRS_NAME);
 bool WrappedPairs(const std::string& pairs, Json::Value& out, bool typed, bool decode) __asm__("__wrap_" PAIRS_NAME);
 bool WrappedRead(Json::Value& out, const char* path) __asm__("__wrap_" READ_NAME);
@@ -25,6 +30,10 @@ bool WrappedPairs(const std::string& pairs, Json::Value& out, bool typed, bool d
         return false;
     }
     return RealPairs(pairs, out, typed, decode);
+}
+
+bool WrappedHash(ZovaSzHash* hash, Json::Value& out) {
+    return FakePlatform::Required("SzHashToJsonObj").Enter("SzHashToJsonObj", "", ENOMEM) && RealHash(hash, out);
 }
 
 bool WrappedRead(Json::Value& out, const char* path) {

@@ -37,6 +37,19 @@ bool WebAPIUtil::strPairToJsonObj(const std::string& pairs, Json::Value& out, bo
     return true;
 }
 
+bool WebAPIUtil::SzHashToJsonObj(ZovaSzHash* hash, Json::Value& out) {
+    if (hash == nullptr || (!out.isObject() && !out.isNull())) {
+        return false;
+    }
+    for (unsigned int at = 0; at < hash->count; ++at) {
+        const ZovaSzPair& pair = hash->pairs[at];
+        if (pair.key != nullptr && pair.value != nullptr) {
+            out[pair.key] = pair.value;
+        }
+    }
+    return true;
+}
+
 bool WebAPIUtil::ReadJsonFile(Json::Value& out, const char* path) {
     constexpr size_t kLargest = 16 * 1024 * 1024;
     return path != nullptr &&

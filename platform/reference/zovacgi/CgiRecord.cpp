@@ -63,9 +63,11 @@ void ZovaCgiFree(ZovaCgi* cgi) {
     if (cgi == nullptr) {
         return;
     }
+    QLIBCSzHashFree(cgi->params);
     free(cgi->sessFile);
     free(cgi->sessDir);
     delete static_cast<CgiState*>(cgi->state);
+    cgi->params = nullptr;
     cgi->sessFile = nullptr;
     cgi->sessDir = nullptr;
     cgi->state = nullptr;

@@ -22,7 +22,7 @@ int ZOVAFSMkdirP(const char* path, int, int keepMode, int uid, int gid, unsigned
     while (place.size() > 1 && place.back() == '/') {
         place.pop_back();
     }
-    if (place.size() < 2 || place.front() != '/' || HasParentStep(place) || (mode & ~07777u) != 0) {
+    if (place.size() < 2 || place.front() != '/' || HasParentStep(place) || (mode & ~(07777u | S_IFDIR)) != 0) {
         errno = EINVAL;
         return -1;
     }
@@ -43,5 +43,5 @@ int ZOVAFSMkdirP(const char* path, int, int keepMode, int uid, int gid, unsigned
     if ((uid != -1 || gid != -1) && fchown(directory.Get(), static_cast<uid_t>(uid), static_cast<gid_t>(gid)) != 0) {
         return -1;
     }
-    return fchmod(directory.Get(), static_cast<mode_t>(mode));
+    return fchmod(directory.Get(), static_cast<mode_t>(mode & 07777u));
 }

@@ -13,6 +13,7 @@
 #include <stdexcept>
 
 #include "ProbeDownload.h"
+#include "ProbeUpload.h"
 #include "ProcessState.h"
 
 namespace {
@@ -164,6 +165,11 @@ const ZOVA::_tag_API_TABLE kTable[] = {
     {kAPI, 1, "write_lasting", Write},
     {kAPI, 1, "answer_long", AnswerLong},
     {kAPI, 1, "start_task", StartTask},
+    {kAPI, 1, "upload", probe::TellUpload},
+    {kAPI, 1, "upload_lasting", probe::TellUpload},
+    {kAPI, 1, "upload_deferred", probe::TakeUpload},
+    {kAPI, 1, "upload_refused", probe::TellUpload},
+    {kAPI, 1, "upload_held", Hold},
     {kDaemonAPI, 1, "place", TellPlace},
     {kDaemonAPI, 1, "as_nobody", TellPlace},
     {kDaemonAPI, 1, "kept", TellPlace},
@@ -179,6 +185,7 @@ const ZOVA::_tag_API_TABLE kTable[] = {
 const ZOVA::_tag_API_CHECK_TABLE kChecks[] = {
     {kAPI, 1, "refused", RefuseWithAnError, nullptr, nullptr},
     {kAPI, 1, "check_throws", ThrowInACheck, nullptr, nullptr},
+    {kAPI, 1, "upload_refused", RefuseWithAnError, nullptr, nullptr},
     {nullptr, 0, nullptr, nullptr, nullptr, nullptr},
 };
 

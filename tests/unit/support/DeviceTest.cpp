@@ -15,6 +15,10 @@ constexpr const char* kGoodMethods = R"([
     {"by_user_lasting": {"grantByUser": true}},
     {"lasting": {}},
     {"keep_input": {"grantable": true, "allowUpload": true}},
+    {"upload": {"grantable": true, "allowUpload": true}},
+    {"upload_lasting": {"grantByUser": true, "allowUpload": true}},
+    {"upload_as_root": {"grantByDefault": true, "allowUpload": true}},
+    {"upload_deferred": {"grantable": true, "allowUpload": true, "deferUpload": true}},
     {"keep_output": {"grantable": true, "allowDownload": true}}
 ])";
 
