@@ -38,8 +38,11 @@ constexpr const char* kGroupDirectory = ZOVA_REFERENCE_ROOT "/var/lib/zova/group
 // Null: wherever the system keeps its PAM services.
 constexpr const char* kPamDirectory = sizeof(ZOVA_REFERENCE_ROOT) > 1 ? ZOVA_REFERENCE_ROOT "/etc/pam.d" : nullptr;
 
+constexpr const char* kSharingDirectory = ZOVA_REFERENCE_ROOT "/var/lib/zova/sharing";
+constexpr const char* kSharingDatabase = ZOVA_REFERENCE_ROOT "/var/lib/zova/sharing/sharing.db";
 constexpr const char* kModuleDirectory = ZOVA_REFERENCE_MODULES;
 constexpr const char* kCryptoModule = "zova-crypto.so";
 constexpr const char* kLoginModule = "zova-login.so";
+constexpr const char* kSqliteModule = "zova-sqlite.so";
 
 }  // namespace reference::paths

@@ -19,6 +19,7 @@
 #include "zovacredential.h"
 #include "zovacredentials.h"
 #include "zovadaemon.h"
+#include "zovalinks.h"
 #include "zovalogin.h"
 #include "zovasdk.h"
 #include "zovasharing.h"

@@ -48,7 +48,10 @@ public:
     bool ParseHostAndPort();
     bool ParsePathAndName();
 
+    /** Reads the sharing link of the request and asks the sharing database about it. */
     void InitSharing();
+    /** Has the URL of sharing links worked out, once per store. */
+    void InitSharingURL();
 
     /** Deciphers what is enciphered in a parameter object, in place. */
     bool DecryptParam(Json::Value& params);
