@@ -5,7 +5,9 @@
 
 #include <json/value.h>
 
-#include "zovasharing.h"
+namespace ZOVA::sharing::record {
+class Entry;
+}
 
 extern "C" {
 
