@@ -266,6 +266,13 @@ public:
     sharing::record::Entry GetSharingEntry() const;
     sharing::record::Session GetSharingSession() const;
     sharing::record::Token GetSharingToken() const;
+    /**
+     * URL under which the sharing links of this server are reached, worked out at the first question from the URL of
+     * this request. `fallback` stands in only for a store that cannot hold it: "" comes for a URL that cannot be told.
+     */
+    std::string GetSharingURL(const std::string& fallback);
+    /** Kind of that URL; 0 for a request that was rebuilt from its serialised form with the URL in it. */
+    sharing::_tag_SHARING_URL_TYPE GetSharingURLType();
 
 private:
     friend class APIRequestPrivate;

@@ -43,4 +43,23 @@ struct _tag_API_CHECK_TABLE {
     void* reserved2;
 };
 
+/**
+ * One row of the table by which a project says what the visitors of its sharing links may call, given out by its check
+ * library through
+ *
+ *     WEBAPI_LIBRARY_EXPORT const ZOVA::_tag_API_SHARING_CHECK_TABLE* GetAPISharingCheckTable();
+ *
+ * The first row that fits decides, by its function; a call that no row fits is closed to visitors. The last row has a
+ * null `apiRegex`.
+ */
+struct _tag_API_SHARING_CHECK_TABLE {
+    /** POSIX extended regular expression for the API's name, or "*". Not anchored: "^" and "$" are the author's. */
+    const char* apiRegex;
+    /** 0 fits every version. */
+    int version;
+    /** As `apiRegex`, for the method's name. */
+    const char* methodRegex;
+    APICheckFunc check;
+};
+
 }  // namespace ZOVA

@@ -41,7 +41,10 @@ public:
      * @return 0 or the error number.
      */
     int CheckPermission(bool allowTimeout);
-    /** The gate of sharing links. */
+    /**
+     * The gate of sharing links: the method allows them, link and session are good, the project agrees. Error 101, 122
+     * to 127 or 150 in the response if not. A link for one named user makes the call one of that user.
+     */
     bool CheckSharingPermission(APIRequest* request, APIResponse* response) override;
     /** False only for "authLevel" 0. */
     bool NeedPermission(APIRequest* request) override;
@@ -74,6 +77,27 @@ public:
     bool DecryptAESParam(Json::Value& params);
     /** The first form fields of an upload, which name the API. */
     bool LoadUploadAPIDesc(Json::Value& out);
+
+    // ---- the project's say about a sharing call ----
+
+    /**
+     * Runs the project's check in the project's hat and under the identity of its check library; both are as before
+     * afterwards. False also if there is no check. Logs why, but for a check that says no.
+     */
+    bool CheckSharingAppPermission(APIRequest* request, APIResponse* response);
+    /** Makes the call one of the user to whom the visitor's session belongs; leaves it alone if there is none. */
+    void InitSharingSession(APIRequest* request);
+    /** Path of the project's check library; "" without a usable project name. */
+    std::string GetSharingCheckLibPath(APIRequest* request);
+    /** Opens the check library, once per path, and asks for its table. Logs failures. */
+    bool OpenSharingCheckLib(APIRequest* request, _tag_API_SHARING_CHECK_TABLE** table);
+    /** The table of an open check library, which keeps it; false, with a line in the log, if it gives none. */
+    bool GetSharingCheckTableFunc(void* handle, _tag_API_SHARING_CHECK_TABLE** table);
+    /** The function of the first row that fits the call. Logs rows without an expression. */
+    bool GetSharingCheckFunc(APIRequest* request, _tag_API_SHARING_CHECK_TABLE* table,
+                             bool (**check)(APIRequest*, APIResponse*));
+    /** 0 if the expression is "*" or matches anywhere in the text; another number else, also for a malformed one. */
+    int RegexMatch(const char* regex, const char* text);
 
     /** Passes the call on to a peer device. */
     bool ProcessRelay(APIRequest* request, APIResponse* response);

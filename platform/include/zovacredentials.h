@@ -11,4 +11,10 @@ extern "C" {
  */
 bool ResetCredentialsByName(const char* user, bool keep);
 
+/**
+ * Takes on, with the way back open, the identity that belongs to the named file. Needs effective root.
+ * @return true if there is such an identity and it was taken as a whole; otherwise nothing has changed.
+ */
+bool InitCredentialsByExecutable(const char* path, int keep);
+
 }  // extern "C"

@@ -19,10 +19,21 @@ struct ZovaVolumeInfo {
  */
 int VolumeAvailGet(unsigned long long size, ZovaVolumeInfo* info, int* id, int unused);
 
+/** An account. */
+struct ZovaUserRecord {
+    char* name;
+    uid_t uid;
+    gid_t gid;
+};
+
 /** Creates the directory with its parents and the given mode; -1 keeps the owner. Negative on failure. */
 int ZOVAFSMkdirP(const char* path, int unused, int keepMode, int uid, int gid, unsigned int mode);
 /** 0 on success; "system" is root. */
 int ZOVAUserGetUGID(const char* user, uid_t* uid, gid_t* gid);
+/** Looks an account up; 0 on success, with a record that the caller gives back to `ZOVAUserFree`. */
+int ZOVAUserGetByUID(uid_t uid, ZovaUserRecord** user);
+/** Frees a record; null is fine. */
+void ZOVAUserFree(ZovaUserRecord* user);
 /** Preference directory of a user or group as text; negative on failure. */
 int ZOVAUserPreferenceDirGet(const char* user, char* buffer, int size);
 int ZOVAGroupPreferenceDirGet(const char* group, char* buffer, int size);

@@ -20,6 +20,7 @@
 #include "zovacredential.h"
 #include "zovacredentials.h"
 #include "zovadaemon.h"
+#include "zovalinks.h"
 #include "zovalogin.h"
 #include "zovanetsdk.h"
 #include "zovasdk.h"

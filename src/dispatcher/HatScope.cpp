@@ -5,6 +5,7 @@
 
 #include <cerrno>
 #include <cstdlib>
+#include <initializer_list>
 
 #include "base/ErrnoGuard.h"
 #include "base/Log.h"
@@ -18,7 +19,7 @@ namespace {
 constexpr const char* kStackVariable = "APPARMOR_HAT_ARRAY";
 constexpr const char* kDefaultHat = "DefaultHat";
 constexpr const char* kEmptyHat = "EmptyHat";
-constexpr int kAttempts = 3;
+constexpr const char* kDefaultSharingHat = "DefaultSharingHat";
 constexpr unsigned long kTokenOffset = 0x5a4f5641;
 
 Json::Value StackFromEnvironment() {
@@ -36,10 +37,10 @@ void StackToEnvironment(const Json::Value& stack) {
     setenv(kStackVariable, Json::toString(stack).c_str(), 1);
 }
 
-/** Enters the first of the call's hats that exists, and gives its name; null if none can be entered. */
-const char* EnterFirst(const std::string& methodHat, const std::string& apiHat) {
-    for (const char* hat : {methodHat.c_str(), apiHat.c_str(), kDefaultHat}) {
-        if (ChangeHat(hat, hatToken) == 0) {
+/** Enters the first of the hats that exists, and gives its name; null if none can be entered. */
+const char* EnterFirst(std::initializer_list<const char*> hats, int attempts) {
+    for (const char* hat : hats) {
+        if (ChangeHat(hat, hatToken, attempts) == 0) {
             return hat;
         }
     }
@@ -50,10 +51,10 @@ const char* EnterFirst(const std::string& methodHat, const std::string& apiHat) 
 
 const unsigned long hatToken = static_cast<unsigned long>(getpid()) + kTokenOffset;
 
-int ChangeHat(const char* name, unsigned long token) {
+int ChangeHat(const char* name, unsigned long token, int attempts) {
     for (int attempt = 1;; ++attempt) {
         const int result = aa_change_hat(name, token);
-        if (result == 0 || errno != ECHILD || attempt == kAttempts) {
+        if (result == 0 || errno != ECHILD || attempt == attempts) {
             return result;
         }
         sleep(1);
@@ -68,11 +69,28 @@ HatScope::HatScope(const std::string& api, const std::string& method)
     entryStack = StackFromEnvironment();
     Json::Value stack = entryStack;
     const std::string methodHat = api + "." + method;
-    const char* entered = EnterFirst(methodHat, api);
+    const char* entered = EnterFirst({methodHat.c_str(), api.c_str(), kDefaultHat}, attempts);
     if (entered == nullptr) {
         entered = kEmptyHat;
         WEBAPI_LOG(LOG_ERR, "AppArmor: chagehat failed [%m]");
     }
+    stack.append(entered);
+    StackToEnvironment(stack);
+}
+
+HatScope::HatScope(const SharingProject& project)
+    : restricted(ZOVA_aa_has_profile_restricted() != 0), attempts(1), entryStack(StackFromEnvironment()) {
+    if (!restricted) {
+        return;
+    }
+    const std::string projectHat = "SHARING." + project.name;
+    const char* entered = EnterFirst({projectHat.c_str(), kDefaultSharingHat}, attempts);
+    if (entered == nullptr) {
+        WEBAPI_LOG(LOG_ERR, "AppArmor: chagehat failed [%m]");
+        refused = true;
+        return;
+    }
+    Json::Value stack = entryStack;
     stack.append(entered);
     StackToEnvironment(stack);
 }
@@ -88,12 +106,12 @@ void HatScope::Restore() {
     }
     restricted = false;
     if (entryStack.empty()) {
-        if (ChangeHat(nullptr, hatToken) == -1) {
+        if (ChangeHat(nullptr, hatToken, attempts) == -1) {
             WEBAPI_LOG(LOG_ERR, "AppArmor: chagehat Original Hat failed [%m]");
         }
     } else {
         const std::string hat = Json::asString(entryStack[entryStack.size() - 1]);
-        if (ChangeHat(hat.c_str(), hatToken) == -1) {
+        if (ChangeHat(hat.c_str(), hatToken, attempts) == -1) {
             WEBAPI_LOG(LOG_ERR, "AppArmor: chagehat [%s] failed [%m]", hat.c_str());
         }
     }

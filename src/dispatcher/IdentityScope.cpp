@@ -106,6 +106,21 @@ void IdentityScope::Restore() {
     if (geteuid() == 0 && setgroups(groups.size(), groups.data()) != 0) {
         WEBAPI_LOG(LOG_AUTH | LOG_ERR, "ERROR: setgroups(%zu) [%m]", groups.size());
     }
+    RestoreIds();
+}
+
+void IdentityScope::RestoreKept() {
+    RestoreIds();
+    std::vector<gid_t> now(groups.size());
+    const int count = getgroups(0, nullptr);
+    const bool same =
+        count == static_cast<int>(groups.size()) && getgroups(count, now.data()) == count && now == groups;
+    if (!same && setgroups(groups.size(), groups.data()) != 0) {
+        WEBAPI_LOG(LOG_AUTH | LOG_ERR, "ERROR: setgroups(%zu) [%m]", groups.size());
+    }
+}
+
+void IdentityScope::RestoreIds() {
     const int group[] = {static_cast<int>(realGroup), static_cast<int>(effectiveGroup), static_cast<int>(savedGroup)};
     if (setresgid(realGroup, effectiveGroup, savedGroup) != 0) {
         LogRefusal("resgid", group[0], group[1], group[2]);

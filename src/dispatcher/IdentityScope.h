@@ -33,7 +33,16 @@ public:
      */
     void Restore();
 
+    /**
+     * The same for an identity whose ids are still at hand as real or saved ones: regains nothing first, and touches
+     * the supplementary groups only if they have changed.
+     */
+    void RestoreKept();
+
 private:
+    /** Sets the noted ids, group first. */
+    void RestoreIds();
+
     uid_t realUser = 0;
     uid_t effectiveUser = 0;
     uid_t savedUser = 0;

@@ -53,7 +53,10 @@ public:
     /** A flag of the section "userAgent", after `InitUA`; false where there is none. */
     bool UserAgentFlag(const char* key);
 
+    /** Reads the sharing link of the request and asks the sharing database about it. */
     void InitSharing();
+    /** Has the URL of sharing links worked out, once per store. */
+    void InitSharingURL();
 
     /**
      * Deciphers a parameter object in place: its cipher text, then its AES pair, then the object "webapi" in it in the

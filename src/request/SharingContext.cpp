@@ -21,4 +21,31 @@ void APIRequestPrivate::InitSharing() {
     }
 }
 
+void APIRequestPrivate::InitSharingURL() {
+    if (HasData("url", "urlSharing")) {
+        return;
+    }
+    // Behind the device's own name no application prefix is looked at.
+    const std::string host = Json::asString(GetData("environ", "HOST", ""));
+    const std::string rewriteApp = host.empty() ? Json::asString(GetData("environ", "REWRITE_APP", "")) : "";
+    const std::string path = owner->GetURLPath("");
+    const bool https = owner->GetURLProto("http") == "https";
+    const int port = owner->GetURLPort(0);
+    std::string url;
+    sharing::_tag_SHARING_URL_TYPE type = sharing::SHARING_URL_UNKNOWN;
+    sharing::GetSharingURL(owner->GetURLHost(""), port, https, path, rewriteApp, url, type);
+    SetData("url", "urlSharing", url, true);
+    sharingUrlType = type;
+}
+
+std::string APIRequest::GetSharingURL(const std::string& fallback) {
+    d->InitSharingURL();
+    return Json::asString(d->GetData("url", "urlSharing", fallback));
+}
+
+sharing::_tag_SHARING_URL_TYPE APIRequest::GetSharingURLType() {
+    d->InitSharingURL();
+    return d->sharingUrlType;
+}
+
 }  // namespace ZOVA

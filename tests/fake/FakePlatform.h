@@ -13,6 +13,7 @@
 #include "FakeHttp.h"
 #include "FakeProcess.h"
 #include "ForkedChildren.h"
+#include "zovasharing.h"
 
 namespace fake {
 
@@ -135,8 +136,17 @@ public:
     std::map<std::string, std::string> cipherEnvelopes;
     std::map<std::string, std::string> cipherAES;
     /** Sharing links by hash. */
-    std::set<std::string> sharingEntries;
+    std::map<std::string, ZOVA::sharing::record::Entry> sharingEntries;
+    /** What a visitor's session id is found as. */
+    ZOVA::sharing::record::Session sharingSession;
     bool sharingDatabaseGood = true;
+    int sharingResult = 1;
+    /** What the URL of sharing links is told to be; "" for none. */
+    std::string sharingURL;
+    /** User whose identity belongs to a file, by path. */
+    std::map<std::string, std::string> executableIdentities;
+    /** Accounts that nobody has given back. */
+    int userRecords = 0;
 
     /** Services behind unix sockets: what each answers to a text, by path. */
     std::map<std::string, std::function<std::string(const std::string&)>> services;

@@ -1,13 +1,15 @@
 // libzovasdk.so.6 and libzovacredentials.so.6 on the fake platform.
 
 #include <cerrno>
+#include <cstdlib>
 #include <cstring>
 
-#include "FakePlatform.h"
+#include "Wrap.h"
 #include "zovacredentials.h"
 #include "zovasdk.h"
 
 using fake::FakePlatform;
+using fake::Shown;
 
 namespace {
 
@@ -118,6 +120,45 @@ bool ResetCredentialsByName(const char* user, bool keep) {
     }
     const unsigned int uid = keep ? kUnchanged : target.uid;
     return process.SetUser(uid, target.uid, uid) == 0;
+}
+
+bool InitCredentialsByExecutable(const char* path, int keep) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    if (!platform.Enter(__func__, std::string(path) + ", " + Shown(keep), EPERM)) {
+        return false;
+    }
+    const auto found = platform.executableIdentities.find(path);
+    if (found == platform.executableIdentities.end()) {
+        return false;
+    }
+    const fake::User& target = platform.users.at(found->second);
+    return platform.process.SetGroups(target.groups) == 0 &&
+           platform.process.SetGroup(kUnchanged, target.gid, kUnchanged) == 0 &&
+           platform.process.SetUser(kUnchanged, target.uid, kUnchanged) == 0;
+}
+
+int ZOVAUserGetByUID(uid_t uid, ZovaUserRecord** out) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    if (!platform.Enter(__func__, Shown(uid), EIO)) {
+        return -1;
+    }
+    for (const auto& [name, user] : platform.users) {
+        if (user.uid == uid) {
+            *out = new ZovaUserRecord{strdup(name.c_str()), user.uid, user.gid};
+            ++platform.userRecords;
+            return 0;
+        }
+    }
+    errno = ENOENT;
+    return -1;
+}
+
+void ZOVAUserFree(ZovaUserRecord* user) {
+    if (user != nullptr) {
+        --FakePlatform::Required(__func__).userRecords;
+        free(user->name);
+        delete user;
+    }
 }
 
 }  // extern "C"

@@ -3,7 +3,7 @@
 #include <cerrno>
 #include <cstring>
 
-#include "FakePlatform.h"
+#include "Wrap.h"
 #include "zovaaccesstoken.h"
 #include "zovacloudservice.h"
 #include "zovacredential.h"
@@ -12,6 +12,7 @@
 #include "zovaw3.h"
 
 using fake::FakePlatform;
+using fake::Shown;
 
 extern "C" {
 
@@ -23,6 +24,17 @@ int ZOVANetGetAddrType(const char* text) {
 }
 
 const char* const SZ_X_SHARING_HEADER = "HTTP_X_FAKE_SHARING";
+
+int ZovaSharingIsAuthorized(const ZovaSharingCredentials* credentials) {
+    FakePlatform& platform = FakePlatform::Required(__func__);
+    for (const void* reserved : credentials->reserved) {
+        if (reserved != nullptr) {
+            fake::Unmodelled("sharing credentials that are not zeroed");
+        }
+    }
+    const std::string arguments = Shown(credentials->sharingId) + ", " + Shown(credentials->sessionId);
+    return platform.Enter(__func__, arguments, EIO) ? platform.sharingResult : 0;
+}
 
 int ZovaAccessTokenGrant(const std::string* tokenId, const char* api, const char* method, char* user, int userSize) {
     FakePlatform& platform = FakePlatform::Required(__func__);
@@ -65,6 +77,43 @@ namespace sharing {
 
 const char* const SZK_SHARING_SID = "sharing_sid";
 
+bool GetSharingURL(const std::string& host, int port, bool https, const std::string& path,
+                   const std::string& rewriteApp, std::string& url, _tag_SHARING_URL_TYPE& type) {
+    FakePlatform& platform = FakePlatform::Required("GetSharingURL");
+    const std::string arguments =
+        host + ", " + std::to_string(port) + (https ? ", https, " : ", http, ") + path + ", " + rewriteApp;
+    if (!platform.Enter("GetSharingURL", arguments, EINVAL) || platform.sharingURL.empty()) {
+        return false;
+    }
+    url = platform.sharingURL;
+    type = SHARING_URL_HOST;
+    return true;
+}
+
+namespace record {
+
+std::string Entry::get_project_name() const {
+    return projectName;
+}
+
+int Entry::get_protect_type() const {
+    return protectType;
+}
+
+bool Entry::get_enable_match_ip() const {
+    return matchIp;
+}
+
+uid_t Session::get_uid() const {
+    return uid;
+}
+
+std::int64_t Session::get_timeout() const {
+    return timeout;
+}
+
+}  // namespace record
+
 namespace db {
 
 BaseDB::~BaseDB() = default;
@@ -87,6 +136,7 @@ bool EntryDB::GetByHash(const std::string& hash, record::Entry& out) const {
     if (!platform.Enter("EntryDB::GetByHash", hash, EIO) || platform.sharingEntries.count(hash) == 0) {
         return false;
     }
+    out = platform.sharingEntries[hash];
     out.hash = hash;
     return true;
 }
@@ -94,10 +144,11 @@ bool EntryDB::GetByHash(const std::string& hash, record::Entry& out) const {
 SessionDB::SessionDB(BaseDB& base) : database(base) {}
 
 bool SessionDB::GetBySessionId(const std::string& sid, record::Session& out) const {
-    if (!FakePlatform::Required("SessionDB::GetBySessionId").Enter("SessionDB::GetBySessionId", sid, EIO)) {
+    FakePlatform& platform = FakePlatform::Required("SessionDB::GetBySessionId");
+    if (!platform.Enter("SessionDB::GetBySessionId", sid, EIO) || platform.sharingSession.id == 0) {
         return false;
     }
-    out.id = sid;
+    out = platform.sharingSession;
     return true;
 }
 
@@ -105,10 +156,10 @@ TokenDB::TokenDB(BaseDB& base) : database(base) {}
 
 bool TokenDB::GetBySessionEntry(const record::Session& session, const record::Entry& entry, record::Token& out) const {
     if (!FakePlatform::Required("TokenDB::GetBySessionEntry")
-             .Enter("TokenDB::GetBySessionEntry", session.id + ", " + entry.hash, EIO)) {
+             .Enter("TokenDB::GetBySessionEntry", std::to_string(session.id) + ", " + entry.hash, EIO)) {
         return false;
     }
-    out.id = session.id + " of " + entry.hash;
+    out.id = session.id;
     return true;
 }
 

@@ -32,7 +32,10 @@ FAKE_EXPORT void* __wrap_dlopen(const char* path, int mode) {
     if (platform != nullptr && path != nullptr && std::string(path) == "libcurl.so.4") {
         return fake::CurlHandle();
     }
-    return __real_dlopen(path, mode);
+    if (platform == nullptr || path == nullptr) {
+        return __real_dlopen(path, mode);
+    }
+    return __real_dlopen(platform->Redirected(path).c_str(), mode);
 }
 
 FAKE_EXPORT void* __wrap_dlsym(void* handle, const char* name) {

@@ -205,3 +205,29 @@ TEST(Credentials, AreNotTakenForGoodWhereTheWayBackStaysOpen) {
               }),
               0);
 }
+
+TEST(Credentials, ByExecutableAreThoseOfTheAccountNamedLikeTheFile) {
+    for (const char* path : {"/usr/lib/x/alice.so", "alice.so", "/usr/lib/x/alice"}) {
+        EXPECT_EQ(StatusOfChild([path] {
+                      TakeOddGroups();
+                      return InitCredentialsByExecutable(path, 1) && UserIds() == Ids{0, kAliceUid, 0} &&
+                                     GroupIds() == Ids{0, kAliceGid, 0} &&
+                                     Groups() == std::vector<gid_t>{kAliceGid, kFriendsGid}
+                                 ? 0
+                                 : 1;
+                  }),
+                  0)
+            << path;
+    }
+}
+
+TEST(Credentials, ByExecutableChangeNothingWhereNoAccountHasItsName) {
+    for (const char* path : {static_cast<const char*>(nullptr), "", "/usr/lib/x/nobodyknows.so", "/usr/lib/alice/",
+                             "/usr/lib/x/system.so", ".so", "/usr/lib/x/alice.b.so"}) {
+        EXPECT_EQ(StatusOfChild([path] {
+                      TakeOddGroups();
+                      return !InitCredentialsByExecutable(path, 1) && IsAsBefore() ? 0 : 1;
+                  }),
+                  0);
+    }
+}

@@ -52,7 +52,7 @@ size_t Count(const std::string& text, const std::string& part) {
 TEST(LinkedProgram, MapsOneObjectForAllNamesAndNoCipherOrLoginLibrary) {
     const std::string mapped = LinkProbeLine("start");
     EXPECT_EQ(Count(mapped, "libzova") + Count(mapped, "libwebapi"), 1u) << mapped;
-    for (const char* library : {"libcrypto", "libssl", "libpam", "libcurl", "libsqlite", "zova-crypto", "zova-login"}) {
+    for (const char* library : {"libcrypto", "libssl", "libpam", "libcurl", "libsqlite", "zova-crypto", "zova-login", "zova-sqlite"}) {
         EXPECT_EQ(Count(mapped, library), 0u) << library;
     }
 }
@@ -73,20 +73,6 @@ TEST(LazyModule, HasNoSymbolsIfItCannotBeOpened) {
     reference::LazyModule crypto("zova-crypto.so");
     EXPECT_EQ(crypto.Find<int()>("anything"), nullptr);
     EXPECT_NE(crypto.Find<int()>("ZovaCryptoOpenSealed"), nullptr);
-}
-
-TEST(Sharing, HasNoDatabase) {
-    using namespace ZOVA::sharing;
-    EXPECT_STREQ(SZ_X_SHARING_HEADER, "HTTP_X_SHARING_ID");
-    EXPECT_STREQ(SZK_SHARING_SID, "sharing_sid");
-    db::SharingDB& database = db::SharingDB::Instance();
-    EXPECT_FALSE(database.IsGood());
-    record::Entry entry;
-    record::Session session;
-    record::Token token;
-    EXPECT_FALSE(db::EntryDB(database).GetByHash("x", entry));
-    EXPECT_FALSE(db::SessionDB(database).GetBySessionId("x", session));
-    EXPECT_FALSE(db::TokenDB(database).GetBySessionEntry(session, entry, token));
 }
 
 TEST_F(WebServer, RunsTheCommandWithItsArgumentsAndNoShell) {

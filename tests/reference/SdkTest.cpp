@@ -191,3 +191,19 @@ TEST(Confinement, IsToldWithoutAnError) {
     // The test runs unconfined, on kernels with AppArmor and without it.
     EXPECT_EQ(ZOVA_aa_has_profile_restricted(), 0);
 }
+
+TEST(Users, FindsAUserByIdButNeverRoot) {
+    ZovaUserRecord* user = nullptr;
+    ASSERT_EQ(ZOVAUserGetByUID(kAliceUid, &user), 0);
+    EXPECT_STREQ(user->name, "alice");
+    EXPECT_EQ(user->uid, kAliceUid);
+    EXPECT_EQ(user->gid, kAliceGid);
+    ZOVAUserFree(user);
+    ZOVAUserFree(nullptr);
+    user = nullptr;
+    for (const uid_t none : {static_cast<uid_t>(0), static_cast<uid_t>(4711), static_cast<uid_t>(-1)}) {
+        EXPECT_NE(ZOVAUserGetByUID(none, &user), 0) << none;
+    }
+    EXPECT_NE(ZOVAUserGetByUID(kAliceUid, nullptr), 0);
+    EXPECT_EQ(user, nullptr);
+}

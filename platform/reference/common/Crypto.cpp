@@ -83,6 +83,12 @@ bool Sha256(std::string_view data, std::string& digest) {
     return hash != nullptr && hash(BytesOf(data), digest.data()) == 0;
 }
 
+bool Scrypt(std::string_view password, std::string_view salt, std::string& key) {
+    auto* scrypt = module.Find<decltype(ZovaCryptoScrypt)>("ZovaCryptoScrypt");
+    key.assign(kKeySize, '\0');
+    return scrypt != nullptr && scrypt(BytesOf(password), BytesOf(salt), key.data(), key.size()) == 0;
+}
+
 }  // namespace crypto
 
 }  // namespace reference

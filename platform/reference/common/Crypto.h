@@ -41,6 +41,9 @@ bool HmacSha256(std::string_view key, std::string_view data, std::string& digest
 /** 32 bytes. */
 bool Sha256(std::string_view data, std::string& digest);
 
+/** scrypt, 32 bytes; slow by intent. */
+bool Scrypt(std::string_view password, std::string_view salt, std::string& key);
+
 }  // namespace crypto
 
 }  // namespace reference

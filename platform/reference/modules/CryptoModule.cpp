@@ -149,3 +149,14 @@ int ZovaCryptoHmacSha256(ZovaBytes key, ZovaBytes data, char* digest) {
 int ZovaCryptoSha256(ZovaBytes data, char* digest) {
     return EVP_Digest(data.data, data.size, Data(digest), nullptr, EVP_sha256(), nullptr) == 1 ? 0 : -1;
 }
+
+int ZovaCryptoScrypt(ZovaBytes password, ZovaBytes salt, char* out, size_t size) {
+    constexpr uint64_t kCost = 1 << 15;
+    constexpr uint64_t kBlockSize = 8;
+    constexpr uint64_t kLanes = 1;
+    constexpr uint64_t kMostMemory = 64 << 20;
+    return EVP_PBE_scrypt(password.data, password.size, Data(salt), salt.size, kCost, kBlockSize, kLanes, kMostMemory,
+                          Data(out), size) == 1
+               ? 0
+               : -1;
+}

@@ -25,4 +25,8 @@ int ZovaCryptoHmacSha256(ZovaBytes key, ZovaBytes data, char* digest);
 /** Writes 32 bytes. 0 on success. */
 int ZovaCryptoSha256(ZovaBytes data, char* digest);
 
+/** scrypt with a cost of 2^15, block size 8, one lane: 32 MiB and about a tenth of a second. `size` bytes; 0 on
+ * success. */
+int ZovaCryptoScrypt(ZovaBytes password, ZovaBytes salt, char* out, size_t size);
+
 }  // extern "C"

@@ -4,6 +4,8 @@
 #include <algorithm>
 #include <cerrno>
 #include <cstring>
+#include <string>
+#include <string_view>
 #include <vector>
 
 #include "Seam.h"
@@ -147,4 +149,13 @@ bool ResetCredentialsByName(const char* user, bool keep) {
     }
     RollBack(before);
     return false;
+}
+
+bool InitCredentialsByExecutable(const char* path, int keep) {
+    const std::string_view file = path == nullptr ? "" : path;
+    const std::string_view name = file.substr(file.rfind('/') + 1);
+    const std::string_view stem = name.substr(0, name.rfind('.'));
+    // The account named as the file is: the file's own owner is root, or the file could not be trusted.
+    return !stem.empty() && stem != reference::kSystemUser &&
+           ResetCredentialsByName(std::string(stem).c_str(), keep != 0);
 }

@@ -1,4 +1,6 @@
+#include <cstdlib>
 #include <cstring>
+#include <optional>
 
 #include "Seam.h"
 #include "common/Accounts.h"
@@ -27,4 +29,24 @@ int QLIBGroupIsAdminGroupMem(const char* user, int) {
     }
     const auto account = reference::FindAccount(user);
     return account && reference::IsInGroup(*account, reference::kAdministrators) ? 1 : 0;
+}
+
+int ZOVAUserGetByUID(uid_t uid, ZovaUserRecord** user) {
+    const auto account = user == nullptr ? std::nullopt : reference::FindAccountOf(uid);
+    if (!account || account->uid == 0) {
+        return -1;
+    }
+    char* name = strdup(account->name.c_str());
+    if (name == nullptr) {
+        return -1;
+    }
+    *user = new ZovaUserRecord{name, account->uid, account->gid};
+    return 0;
+}
+
+void ZOVAUserFree(ZovaUserRecord* user) {
+    if (user != nullptr) {
+        free(user->name);
+        delete user;
+    }
 }

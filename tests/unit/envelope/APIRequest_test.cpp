@@ -158,7 +158,8 @@ TEST_F(APIRequestTest, AfterDeserializeTheArgumentHoldsThePreviousStore) {
 }
 
 TEST_F(APIRequestTest, ACopyAnswersLikeItsSourceWithoutAskingTheSharingDatabase) {
-    platform.sharingEntries.insert("hash");
+    platform.sharingEntries["hash"] = {};
+    platform.sharingSession.id = 3;
     request.InitEnv(J(R"({"HTTP_X_FAKE_SHARING": "hash", "HTTP_COOKIE": "sharing_sid=s"})"));
     ASSERT_TRUE(request.IsSharing());
     platform.calls.clear();
@@ -168,8 +169,8 @@ TEST_F(APIRequestTest, ACopyAnswersLikeItsSourceWithoutAskingTheSharingDatabase)
     EXPECT_EQ(copy.GetSharingID(), "hash");
     EXPECT_EQ(copy.GetSharingSID(), "s");
     EXPECT_EQ(copy.GetSharingEntry().hash, "hash");
-    EXPECT_EQ(copy.GetSharingSession().id, "s");
-    EXPECT_EQ(copy.GetSharingToken().id, "s of hash");
+    EXPECT_EQ(copy.GetSharingSession().id, 3);
+    EXPECT_EQ(copy.GetSharingToken().id, 3);
     EXPECT_EQ(copy.Serialize(), request.Serialize());
 }
 

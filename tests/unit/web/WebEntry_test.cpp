@@ -140,7 +140,7 @@ TEST_F(WebEntryTest, ARelayParameterAnswers109) {
     EXPECT_TRUE(answer.CallsOf("mark").empty());
 }
 
-TEST_F(WebEntryTest, ASharingLinkIsRefusedWith126) {
+TEST_F(WebEntryTest, ASharingLinkToAMethodThatDoesNotAllowThemIsRefusedWith126) {
     const WebAnswer answer = Serve(GoodCall("success").With("HTTP_X_FAKE_SHARING", "hash"));
     EXPECT_EQ(answer.ErrorCode(), 126);
     EXPECT_TRUE(answer.CallsOf("mark").empty());
