@@ -60,6 +60,20 @@ void AskURL(APIRequest& request) {
     FUZZ_CHECK(request.GetURLProto("") == proto && request.GetURLPort(80) == port);
 }
 
+void AskDevice(APIRequest& request) {
+    const bool isMobile = request.IsMobile();
+    request.IsMobileDevice();
+    request.IsIPhone();
+    request.IsAndroid();
+    request.IsIEMobile();
+    request.IsIPad();
+    request.IsPlayBook();
+    request.IsBlackBerry6();
+    request.IsWebKit();
+    request.IsSupportWebApp();
+    FUZZ_CHECK(request.IsMobile() == isMobile);
+}
+
 void AskSession(APIRequest& request) {
     request.GetLoginUserName();
     request.IsAdmin();
@@ -111,6 +125,7 @@ void AskEverything(APIRequest& request) {
     request.GetAttr("", Json::Value());
     AskParameters(request);
     AskURL(request);
+    AskDevice(request);
     AskSession(request);
     AskKind(request);
 }

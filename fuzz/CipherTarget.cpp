@@ -7,6 +7,7 @@
 #include "Check.h"
 #include "CipherTexts.h"
 #include "Target.h"
+#include "envelope/APIRequestPrivate.h"
 #include "request/ParameterCipher.h"
 #include "webapi/Json.h"
 #include "webapi/WebEntry.h"
@@ -71,6 +72,19 @@ Json::Value Pair(const char* token, const std::string& cipherText) {
     return params;
 }
 
+void CheckParameters(const std::string& text) {
+    ZOVA::APIRequest request{Json::Value()};
+    Json::Value params(Json::objectValue);
+    params["other"] = 1;
+    params[ZOVA::kEnvelopeCipherTextKey] = text;
+    params[ZOVA::kEnvelopeKey] = params;
+    const bool good = ZOVA::APIRequestPrivate::Of(request).DecryptParam(params);
+    for (const Json::Value* object : {&params, &params[ZOVA::kEnvelopeKey]}) {
+        FUZZ_CHECK(Json::asInt(Json::member(*object, "other")) == 1);
+        FUZZ_CHECK(!good || !Json::hasMember(*object, ZOVA::kEnvelopeCipherTextKey));
+    }
+}
+
 void CheckIntake(const std::string& text) {
     static ZOVA::WebEntry entry;
     Json::Value out;
@@ -87,6 +101,7 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     CheckLine(text);
     CheckEnvelope(text.compare(0, kLinePrefix.size(), kLinePrefix) == 0 ? text.substr(kLinePrefix.size()) : text);
     CheckPair(Pair(fuzz::kToken, text));
+    CheckParameters(text);
     Json::Value form;
     if (ZOVA::WebAPIUtil::strPairToJsonObj(text, form, true, true)) {
         CheckPair(form);

@@ -10,8 +10,8 @@
 namespace {
 
 constexpr const char* kVariables[] = {
-    "HTTP_COOKIE",    "HTTP_HOST",    "REQUEST_URI",      "HTTPS",          "HTTP_X_FORWARDED_PROTO",
-    "REQUEST_METHOD", "CONTENT_TYPE", "HTTP_X_TYPE_NAME", "HTTP_USER_AGENT"};
+    "HTTP_COOKIE",  "HTTP_HOST",        "REQUEST_URI",     "HTTPS",      "HTTP_X_FORWARDED_PROTO", "REQUEST_METHOD",
+    "CONTENT_TYPE", "HTTP_X_TYPE_NAME", "HTTP_USER_AGENT", "HTTP_UA_OS", "HTTP_X_WAP_PROFILE"};
 
 Json::Value EnvironmentOf(std::string text) {
     Json::Value environment(Json::objectValue);
@@ -47,6 +47,17 @@ void CheckURL(ZOVA::APIRequest& request, const Json::Value& environment) {
     FUZZ_CHECK(!host.empty() || request.GetURLPort(7) == 7);
 }
 
+void CheckDevice(ZOVA::APIRequest& request) {
+    FUZZ_CHECK(!request.IsMobile() || request.IsMobileDevice());
+    FUZZ_CHECK(!request.IsIEMobile() || request.IsMobileDevice());
+    FUZZ_CHECK(!request.IsIPad() || request.IsIPhone());
+    const int families =
+        int{request.IsIPhone()} + int{request.IsAndroid()} + int{request.IsPlayBook()} + int{request.IsBlackBerry6()};
+    FUZZ_CHECK(families <= 1);
+    FUZZ_CHECK(families == 0 || request.IsMobileDevice());
+    FUZZ_CHECK(request.IsSupportWebApp() == (families == 1 && request.IsWebKit()));
+}
+
 }  // namespace
 
 int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
@@ -59,6 +70,7 @@ int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     FUZZ_CHECK(method >= 0 && method <= 3);
     CheckSessionCookie(request, Json::asString(environment["HTTP_COOKIE"]));
     CheckURL(request, environment);
+    CheckDevice(request);
     fuzz::AskEverything(request);
     fuzz::CheckCopies(request);
     return 0;
