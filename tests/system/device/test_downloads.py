@@ -53,10 +53,10 @@ class Reader:
             self.head += self.connection.recv(1)
 
     def read(self, length):
-        data = b""
+        data = bytearray()
         while len(data) < length and (part := self.connection.recv(min(65536, length - len(data)))):
             data += part
-        return data
+        return bytes(data)
 
     def close(self):
         self.connection.close()
