@@ -78,7 +78,7 @@ std::string PartFile::Publish() {
         }
         name = fresh;
     }
-    const std::string path = folder->Path() + "/" + name;
+    std::string path = folder->Path() + "/" + name;
     KeepPublished(std::move(descriptor), path);
     name.clear();
     return path;
