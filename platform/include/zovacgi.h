@@ -121,8 +121,8 @@ int ZovaCgiLoadUploadParams(ZovaCgi* cgi, ZovaCgiUploadCallback callback, ZovaCg
  * Writes the file part that was reached into a new file in `dir`; its path stands in the record's hash under `name`.
  * @return 1, negative on failure; no file is left then.
  */
-int ZovaCgiLoadUploadFileToDir(ZovaCgi* cgi, const char* dir, ZovaCgiUploadCallback callback,
-                               ZovaCgiUploadState* state, char* boundary, char* name);
+int ZovaCgiLoadUploadFileToDir(ZovaCgi* cgi, const char* dir, ZovaCgiUploadCallback callback, ZovaCgiUploadState* state,
+                               char* boundary, char* name);
 /**
  * Reads the rest of the body: form fields into `params`, and the paths of new files in `dir` into `files`.
  * @return an upload status, 1 on success. Files of a body that failed stand in `files`, or are gone.
