@@ -14,6 +14,11 @@ NAMES = {
 }
 
 
+def is_sanitized():
+    with open(device.HOST, "rb") as file:
+        return b"libasan.so" in file.read()
+
+
 class Outcome:
     """What one host process wrote, and how it ended."""
 

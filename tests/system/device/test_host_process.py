@@ -16,17 +16,12 @@ BODY = bad_input.CALL + b"&x=" + b"a" * (4 * MEGABYTE)
 CALL_ENVIRONMENT = {"REQUEST_METHOD": "GET", "QUERY_STRING": bad_input.CALL.decode()}
 
 
-def is_sanitized():
-    with open(device.HOST, "rb") as file:
-        return b"libasan.so" in file.read()
-
-
 def run_with_memory(megabytes):
     """The host program with a large body, when this much memory can be had: in all, or, for a sanitized one, whose
     runtime reserves terabytes, at once."""
     environment = {"REQUEST_METHOD": "POST", "QUERY_STRING": "", "CONTENT_LENGTH": str(len(BODY))}
     limit = None
-    if is_sanitized():
+    if host.is_sanitized():
         environment["ASAN_OPTIONS"] = f"allocator_may_return_null=1:max_allocation_size_mb={megabytes}"
     else:
         limit = megabytes * MEGABYTE
@@ -39,7 +34,7 @@ def run_with_memory(megabytes):
 
 class Memory(device.DeviceTestCase):
     def test_with_any_amount_of_memory_the_answer_is_a_header_block_and_json(self):
-        amounts = range(1, 12) if is_sanitized() else range(8, 80)
+        amounts = range(1, 12) if host.is_sanitized() else range(8, 80)
         answered = {}
         for megabytes in amounts:
             with self.subTest(megabytes=megabytes):
