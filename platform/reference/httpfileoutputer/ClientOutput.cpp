@@ -48,12 +48,13 @@ bool ClientOutput::SendFile(int file, std::uint64_t first, std::uint64_t length)
         const ssize_t sent = sendfile(client, file, &place, static_cast<size_t>(std::min(length, kLargestStep)));
         if (sent > 0) {
             length -= static_cast<std::uint64_t>(sent);
-        } else if (sent == 0) {
-            return false;
-        } else if (errno == EINVAL || errno == ENOSYS) {
+            continue;
+        }
+        if (sent < 0 && (errno == EINVAL || errno == ENOSYS)) {
             // File systems and outputs that the kernel cannot join.
             return CopyFile(file, static_cast<std::uint64_t>(place), length);
-        } else if (!CanTryAgain()) {
+        }
+        if (sent == 0 || !CanTryAgain()) {
             return false;
         }
     }
