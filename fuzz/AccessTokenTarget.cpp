@@ -4,21 +4,13 @@
 
 #include "Check.h"
 #include "Target.h"
+#include "common/ControlBytes.h"
 #include "zovaaccesstoken/TokenRecord.h"
 #include "zovacgi/Session.h"
 
 namespace {
 
 constexpr const char* kUntouched = "as before";
-
-bool IsPrintable(std::string_view text) {
-    for (unsigned char byte : text) {
-        if (byte < 0x20 || byte == 0x7f) {
-            return false;
-        }
-    }
-    return true;
-}
 
 void CheckScopes(const reference::TokenRecord& record) {
     FUZZ_CHECK(!record.apis.empty() && record.apis.size() <= 64);
@@ -37,8 +29,9 @@ void CheckScopes(const reference::TokenRecord& record) {
 
 void CheckGood(const reference::TokenRecord& record) {
     FUZZ_CHECK(reference::IsTokenId(record.id));
-    FUZZ_CHECK(!record.user.empty() && record.user.size() <= reference::kLongestUserName && IsPrintable(record.user));
-    FUZZ_CHECK(record.label.size() <= reference::kLongestTokenLabel && IsPrintable(record.label));
+    FUZZ_CHECK(!record.user.empty() && record.user.size() <= reference::kLongestUserName &&
+               !reference::HasControlByte(record.user));
+    FUZZ_CHECK(record.label.size() <= reference::kLongestTokenLabel && !reference::HasControlByte(record.label));
     FUZZ_CHECK(record.uid != static_cast<uid_t>(-1));
     FUZZ_CHECK(record.created >= 0 && record.expires - record.created <= reference::kLongestTokenTime);
     FUZZ_CHECK(!record.IsInForce(record.expires));

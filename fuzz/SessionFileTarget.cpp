@@ -4,6 +4,7 @@
 
 #include "Check.h"
 #include "Target.h"
+#include "common/ControlBytes.h"
 #include "common/DeviceInformation.h"
 #include "zovacgi/Session.h"
 #include "zovacgi/SessionCheck.h"
@@ -13,19 +14,10 @@ namespace {
 
 constexpr const char* kUntouched = "as before";
 
-bool IsPrintable(std::string_view text) {
-    for (unsigned char byte : text) {
-        if (byte < 0x20 || byte == 0x7f) {
-            return false;
-        }
-    }
-    return true;
-}
-
 void CheckGood(const reference::Session& session) {
     FUZZ_CHECK(!session.user.empty() && session.user.size() <= reference::kLongestUserName);
     for (const std::string* text : {&session.user, &session.address, &session.app, &session.webapi}) {
-        FUZZ_CHECK(IsPrintable(*text));
+        FUZZ_CHECK(!reference::HasControlByte(*text));
     }
     FUZZ_CHECK(session.token.empty() || reference::IsSessionId(session.token));
     FUZZ_CHECK(session.created >= 0);
