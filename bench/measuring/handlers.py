@@ -40,11 +40,12 @@ class Call:
     """One process: its program, the path under which the web server offers it, what the client sends, and the answer
     that has to come; None for one that is another each time."""
 
-    def __init__(self, program, query, cookie=None, form="", expected=EXPECTED, token=None):
+    def __init__(self, program, query, cookie=None, form="", expected=EXPECTED, token=None, link=None):
         self.program = program
         self.query = query
         self.cookie = cookie
         self.token = token
+        self.link = link
         self.form = form.encode()
         self.expected = expected
 
@@ -55,6 +56,8 @@ class Call:
             environment["HTTP_COOKIE"] = self.cookie
         if self.token:
             environment["HTTP_AUTHORIZATION"] = "Bearer " + self.token
+        if self.link:
+            environment["HTTP_X_SHARING_ID"] = self.link
         if self.form:
             environment.update(REQUEST_METHOD="POST", CONTENT_TYPE="application/x-www-form-urlencoded",
                                CONTENT_LENGTH=str(len(self.form)))
@@ -107,9 +110,10 @@ def times_of(call):
     return times
 
 
-def front(api, method, parameters, cookie=None, expected=EXPECTED, token=None):
+def front(api, method, parameters, cookie=None, expected=EXPECTED, token=None, link=None):
     pairs = {"api": api, "version": 1, "method": method, **parameters}
-    return Call(HOST_FOLDER + "/front.cgi", urllib.parse.urlencode(pairs), cookie, expected=expected, token=token)
+    return Call(HOST_FOLDER + "/front.cgi", urllib.parse.urlencode(pairs), cookie, expected=expected, token=token,
+                link=link)
 
 
 def session_cookie(session):

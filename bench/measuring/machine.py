@@ -6,7 +6,7 @@ import platform
 import re
 import subprocess
 
-PACKAGES = ("g++", "libc6", "libstdc++6", "libjsoncpp25", "lighttpd", "php-cgi", "wrk", "valgrind", "strace")
+PACKAGES = ("g++", "libc6", "libstdc++6", "libjsoncpp25", "lighttpd", "nginx-light", "php-cgi", "wrk", "valgrind", "strace")
 
 
 def processor():

@@ -48,6 +48,17 @@ def free_port():
         return probe.getsockname()[1]
 
 
+def wait_for_server(process, port):
+    """Returns when the server listens."""
+    deadline = time.monotonic() + 10
+    while time.monotonic() < deadline and process.poll() is None:
+        with socket.socket() as probe:
+            if probe.connect_ex(("127.0.0.1", port)) == 0:
+                return
+        time.sleep(0.05)
+    raise RuntimeError(f"{process.args[0]} did not start")
+
+
 class WebServer:
     """lighttpd with all measured handlers, for as long as the `with` block lasts."""
 
@@ -60,17 +71,8 @@ class WebServer:
             file.write(configuration)
         self.process = subprocess.Popen(["lighttpd", "-D", "-f", FOLDER + "/lighttpd.conf"],
                                         env={"PATH": "/usr/sbin:/usr/bin:/sbin:/bin"})
-        self._wait()
+        wait_for_server(self.process, self.port)
         return self
-
-    def _wait(self):
-        deadline = time.monotonic() + 10
-        while time.monotonic() < deadline and self.process.poll() is None:
-            with socket.socket() as probe:
-                if probe.connect_ex(("127.0.0.1", self.port)) == 0:
-                    return
-            time.sleep(0.05)
-        raise RuntimeError("the web server did not start")
 
     def __exit__(self, *_):
         self.process.terminate()
