@@ -22,7 +22,7 @@ def of_ctest(path, filtered):
     return passed, failed if passed + failed > 0 or filtered else 1
 
 
-def of_unittest(path):
+def of_counts(path):
     if not os.path.exists(path):
         return 0, 1
     with open(path, encoding="ascii") as file:
@@ -33,8 +33,8 @@ def of_unittest(path):
 def main():
     results = sys.argv[1]
     filtered = len(sys.argv) > 2 and sys.argv[2] != ""
-    parts = [of_ctest(f"{results}/ctest.xml", filtered), of_unittest(f"{results}/machine"),
-             of_unittest(f"{results}/device")]
+    parts = [of_ctest(f"{results}/ctest.xml", filtered), of_counts(f"{results}/gtest"), of_counts(f"{results}/machine"),
+             of_counts(f"{results}/device")]
     passed = sum(part[0] for part in parts)
     failed = sum(part[1] for part in parts)
     print(f"{passed} passed, {failed} failed")
