@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <cstring>
 
+#include "base/Fence.h"
 #include "base/Log.h"
 #include "dispatcher/APIRunnerPrivate.h"
 #include "dispatcher/HatScope.h"
@@ -217,7 +218,10 @@ void APIRunner::HandleCallback(APIResponse* answer) {
     }
     for (const ResponseCallback& callback : *callbacks) {
         if (callback.function != nullptr) {
-            callback.function(callback.argument);
+            // One that throws would unwind the child's copy of the call, and take the others with it.
+            if (const auto thrown = base::ThrownBy([&] { callback.function(callback.argument); })) {
+                WEBAPI_LOG(LOG_ERR, "a callback threw: %s", thrown->c_str());
+            }
         }
     }
     if (restricted && ChangeHat(nullptr, hatToken) < 0) {

@@ -109,10 +109,12 @@ bool APIRunner::InitLibDesc(Json::Value& out, const std::string& api) {
     if (api.empty() || !Json::isObject(out)) {
         return false;
     }
-    if (Json::hasMember(out, api)) {
+    // A file may describe an API under a name that is none, beside others.
+    const bool isName = IsAPIName(api);
+    if (isName && Json::hasMember(out, api)) {
         return true;
     }
-    const std::string file = IsAPIName(api) ? FindDescriptionFile(api) : "";
+    const std::string file = isName ? FindDescriptionFile(api) : "";
     if (file.empty()) {
         WEBAPI_LOG(LOG_ERR, "WebAPI %s is not valid", base::Printable(api).c_str());
         return false;

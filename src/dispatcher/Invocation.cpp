@@ -1,11 +1,13 @@
-#include <exception>
+#include <optional>
 
+#include "base/Fence.h"
 #include "base/Log.h"
 #include "base/Printable.h"
 #include "dispatcher/DirectoryScope.h"
 #include "dispatcher/HatScope.h"
 #include "dispatcher/IdentityPlan.h"
 #include "dispatcher/IdentityScope.h"
+#include "dispatcher/MethodAttributes.h"
 #include "dispatcher/NiceScope.h"
 #include "dispatcher/PermissionFrame.h"
 #include "dispatcher/StreamScope.h"
@@ -43,19 +45,12 @@ const Row& FindRow(const Row* table, const CallName& call) {
  */
 template <class Function>
 bool Fenced(const CallName& call, const char* kind, const Function& function) {
-    const char* what = "not a std::exception";
-    std::string text;
-    try {
-        function();
-        return true;
-    } catch (const std::exception& exception) {
-        text = base::Printable(exception.what());
-        what = text.c_str();
-    } catch (...) {
+    const std::optional<std::string> thrown = base::ThrownBy(function);
+    if (thrown) {
+        WEBAPI_LOG(LOG_ERR, "%s of %s version %d method %s threw: %s", kind, base::Printable(call.api).c_str(),
+                   call.version, base::Printable(call.method).c_str(), thrown->c_str());
     }
-    WEBAPI_LOG(LOG_ERR, "%s of %s version %d method %s threw: %s", kind, base::Printable(call.api).c_str(),
-               call.version, base::Printable(call.method).c_str(), what);
-    return false;
+    return !thrown;
 }
 
 /** True lets the call go on. A check that throws refuses it with 117. */
@@ -142,7 +137,7 @@ bool APIRunner::ProcessLib(APIRequest* call, APIResponse* answer) {
         return false;
     }
 
-    const Json::Value attributes = GetMethod(name.api, name.version, name.method);
+    const Json::Value attributes = MethodAttributes(*this, name);
     const bool allowUpload = Json::asBool(Json::member(attributes, "allowUpload"));
     const bool allowDownload = Json::asBool(Json::member(attributes, "allowDownload"));
     if (Json::asBool(request->GetAttr(kCountAttribute, false)) &&

@@ -6,6 +6,7 @@
 #include <string>
 
 #include "base/Log.h"
+#include "dispatcher/MethodAttributes.h"
 #include "dispatcher/PermissionFrame.h"
 #include "dispatcher/UploadFrame.h"
 #include "envelope/APIRequestPrivate.h"
@@ -84,7 +85,8 @@ bool APIRunner::CanProcessSocket(APIRequest* call) {
         LogFailure("socket is not ready", path);
         return false;
     }
-    const Json::Value& attributes = GetMethod(call->GetAPIClass(), call->GetAPIVersion(), call->GetAPIMethod());
+    const Json::Value& attributes =
+        MethodAttributes(*this, {call->GetAPIClass(), call->GetAPIVersion(), call->GetAPIMethod()});
     // Only this process holds an upload that the method takes itself, and the output that a download writes.
     if ((Allows(attributes, "allowUpload") && Allows(attributes, "deferUpload")) ||
         Allows(attributes, "allowDownload")) {
@@ -99,7 +101,7 @@ bool APIRunner::ProcessSocket(APIRequest* call, APIResponse* answer) {
     if (!PassesGate(*this, call, answer)) {
         return false;
     }
-    const Json::Value attributes = GetMethod(name.api, name.version, name.method);
+    const Json::Value attributes = MethodAttributes(*this, name);
     if (!TakesUpload(*this, name, attributes, call, answer)) {
         return false;
     }

@@ -19,6 +19,11 @@ constexpr const char* kPollingAttributes = "polling_attribute";
 constexpr const char* kAdministratorsOwner = "@administrators";
 constexpr const char* kUsersOwner = "@users";
 
+/** The store takes C texts: an owner, prefix or id that holds a NUL must not pass for what stands before it. */
+inline bool HasNul(const std::string& text) {
+    return text.find('\0') != std::string::npos;
+}
+
 class APIPollingPrivate : public APIBase {
 public:
     APIPollingPrivate(APIPolling* polling, APIRequest* request);

@@ -10,11 +10,6 @@ namespace ZOVA {
 
 namespace {
 
-bool HasNul(const std::string& text) {
-    return text.find('\0') != std::string::npos;
-}
-
-/** The store takes C texts: an owner or id that holds a NUL must not pass for what stands before it. */
 bool TaskExists(const std::string& owner, const std::string& id) {
     return !HasNul(owner) && !HasNul(id) && ZELM::TaskUtil::checkTaskExists(owner.c_str(), id.c_str());
 }

@@ -3,11 +3,10 @@
 #include <cerrno>
 #include <cstdlib>
 #include <cstring>
-#include <exception>
 #include <memory>
 
+#include "base/Fence.h"
 #include "base/Log.h"
-#include "base/Printable.h"
 #include "polling/APIPollingPrivate.h"
 #include "taskmanager.h"
 #include "webapi/APIRequest.h"
@@ -25,16 +24,10 @@ constexpr int kReportSeconds = 60;
 
 /** Calls foreign code: what it throws would otherwise unwind into the parent's side of the call. */
 void RunWork(APIPolling::WorkFunc work, APIRequest* request, APIResponse* response, void* data) {
-    std::string what = "not a std::exception";
-    try {
-        work(request, response, data);
-        return;
-    } catch (const std::exception& exception) {
-        what = base::Printable(exception.what());
-    } catch (...) {
+    if (const auto thrown = base::ThrownBy([&] { work(request, response, data); })) {
+        POLLING_LOG("the work function threw: %s", thrown->c_str());
+        response->SetError(WEBAPI_ERR_INTERNAL, Json::Value());
     }
-    POLLING_LOG("the work function threw: %s", what.c_str());
-    response->SetError(WEBAPI_ERR_INTERNAL, Json::Value());
 }
 
 }  // namespace
@@ -57,7 +50,8 @@ bool APIPollingPrivate::Start(APIResponse* response, APIPolling::WorkFunc work, 
         return false;
     }
 
-    const std::string id = ZELM::TaskUtil::getUniqueID(owner.c_str(), prefix.c_str());
+    const std::string id =
+        HasNul(owner) || HasNul(prefix) ? "" : ZELM::TaskUtil::getUniqueID(owner.c_str(), prefix.c_str());
     const auto task = std::make_unique<ZELM::Task>(owner.c_str(), id.c_str());
     task->beginUpdate();
     task->setProperty("info", DescribeTask(group, prefix, withoutParams));

@@ -53,7 +53,7 @@ std::string ExpiryAttribute(const APIRequest* request, long minutes) {
 
 bool APIResponsePrivate::AddCookie(const std::string& key, const std::string& value, const std::string& path,
                                    long expire, const std::string& domain, bool secure, bool httpOnly) {
-    Json::Value* cookies = data.isObject() ? &data["setCookie"] : nullptr;
+    Json::Value* cookies = Json::hasMember(data, "setCookie") ? &data["setCookie"] : nullptr;
     if (key.empty() || path.empty() || cookies == nullptr || !cookies->isArray()) {
         return false;
     }
@@ -104,7 +104,7 @@ bool APIResponse::SetHeader(const std::string& name, const std::string& value) {
 }
 
 std::string APIResponse::GetHeader(const std::string& name, const std::string& fallback) const {
-    return Json::asString(d->GetData("headers", name, fallback));
+    return name.empty() ? fallback : Json::asString(d->GetData("headers", name, fallback));
 }
 
 Json::Value APIResponse::GetHeaders() const {

@@ -2,8 +2,8 @@
 #include <regex.h>
 
 #include <cstring>
-#include <exception>
 
+#include "base/Fence.h"
 #include "base/Log.h"
 #include "base/Printable.h"
 #include "dispatcher/HatScope.h"
@@ -30,17 +30,12 @@ bool IsEmpty(const char* regex) {
 
 /** Calls into the project's code: no exception leaves it, and one is a no. */
 bool Ask(APICheckFunc check, APIRequest* call, APIResponse* answer) {
-    const char* what = "not a std::exception";
-    std::string text;
-    try {
-        return check(call, answer);
-    } catch (const std::exception& exception) {
-        text = base::Printable(exception.what());
-        what = text.c_str();
-    } catch (...) {
+    bool agreed = false;
+    if (const auto thrown = base::ThrownBy([&] { agreed = check(call, answer); })) {
+        WEBAPI_LOG(LOG_ERR, "the sharing check of %s threw: %s", base::Printable(ProjectOf(*call)).c_str(),
+                   thrown->c_str());
     }
-    WEBAPI_LOG(LOG_ERR, "the sharing check of %s threw: %s", base::Printable(ProjectOf(*call)).c_str(), what);
-    return false;
+    return agreed;
 }
 
 }  // namespace
@@ -80,7 +75,8 @@ bool WebEntry::OpenSharingCheckLib(APIRequest* call, _tag_API_SHARING_CHECK_TABL
     if (handle == nullptr) {
         handle = dlopen(path.c_str(), RTLD_LAZY);
         if (handle == nullptr) {
-            WEBAPI_LOG(LOG_ERR, "cannot open library: %s. error = %s", path.c_str(), dlerror());
+            WEBAPI_LOG(LOG_ERR, "cannot open library: %s. error = %s", base::Printable(path).c_str(),
+                       base::Printable(dlerror()).c_str());
             return false;
         }
         openLibraries[path] = handle;
@@ -126,14 +122,14 @@ bool WebEntry::GetSharingCheckFunc(APIRequest* call, _tag_API_SHARING_CHECK_TABL
             continue;
         }
         if (IsEmpty(row->apiRegex)) {
-            WEBAPI_LOG(LOG_WARNING, "warning: empty api regex in %s", project.c_str());
+            WEBAPI_LOG(LOG_ERR, "warning: empty api regex in %s", project.c_str());
             continue;
         }
         if (RegexMatch(row->apiRegex, api.c_str()) != 0) {
             continue;
         }
         if (IsEmpty(row->methodRegex)) {
-            WEBAPI_LOG(LOG_WARNING, "warning: empty method regex in %s", project.c_str());
+            WEBAPI_LOG(LOG_ERR, "warning: empty method regex in %s", project.c_str());
             continue;
         }
         if (RegexMatch(row->methodRegex, method.c_str()) == 0) {

@@ -2,6 +2,8 @@
 
 #include "base/Log.h"
 #include "dispatcher/IdentityPlan.h"
+#include "dispatcher/MethodAttributes.h"
+#include "envelope/APIRequestPrivate.h"
 #include "webapi/APIRequest.h"
 #include "webapi/APIResponse.h"
 #include "webapi/APIUpload.h"
@@ -78,7 +80,8 @@ bool WebEntry::LoadUploadAPIDesc(Json::Value& out) {
 
 bool WebEntry::HandleUpload(APIRequest* call, APIResponse* answer) {
     APIUpload upload(call);
-    const Json::Value attributes = GetMethod(call->GetAPIClass(), call->GetAPIVersion(), call->GetAPIMethod());
+    const Json::Value attributes =
+        MethodAttributes(*this, {call->GetAPIClass(), call->GetAPIVersion(), call->GetAPIMethod()});
     if (Json::asBool(Json::member(attributes, "deferUpload"))) {
         return true;
     }

@@ -135,6 +135,8 @@ public:
     std::map<std::string, std::string> cipherLines;
     std::map<std::string, std::string> cipherEnvelopes;
     std::map<std::string, std::string> cipherAES;
+    /** Pairs of parameters at which the JSON library throws. */
+    std::string pairsThatThrow;
     /** Sharing links by hash. */
     std::map<std::string, ZOVA::sharing::record::Entry> sharingEntries;
     /** What a visitor's session id is found as. */

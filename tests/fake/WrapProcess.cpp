@@ -184,6 +184,7 @@ FAKE_EXPORT time_t __wrap_time(time_t* out) {
     if (platform == nullptr || platform->clock < 0) {
         return __real_time(out);
     }
+    platform->Enter("time", "", 0);
     if (out != nullptr) {
         *out = static_cast<time_t>(platform->clock);
     }

@@ -1,6 +1,7 @@
 // libwebapi.so: the reference text utilities, recorded and failing on demand. Files come from the fake platform.
 
 #include <cerrno>
+#include <stdexcept>
 
 #include "Wrap.h"
 #include "webapi/Json.h"
@@ -28,6 +29,9 @@ bool WrappedPairs(const std::string& pairs, Json::Value& out, bool typed, bool d
     FakePlatform* platform = FakePlatform::Active();
     if (platform != nullptr && !platform->Enter("strPairToJsonObj", pairs, EINVAL)) {
         return false;
+    }
+    if (platform != nullptr && !pairs.empty() && pairs == platform->pairsThatThrow) {
+        throw std::runtime_error("thrown for \"" + pairs + "\"");
     }
     return RealPairs(pairs, out, typed, decode);
 }

@@ -98,6 +98,12 @@ TEST_F(TaskStartTest, TheRecordTellsWhatTheTaskWasStartedFor) {
     EXPECT_EQ(call.Status(call.TaskId())["auto_remove"], true);
 }
 
+TEST_F(TaskStartTest, AParameterOfTheMethodsOwnThatIsNamedLikeTheCallsIsLostFromTheRecord) {
+    TaskCall call("alice", R"({"api":"ZOVA.Test","version":2,"method":"go","of":{"method":"kept"}})");
+    ASSERT_TRUE(call.Start(ReportAndWork));
+    EXPECT_EQ(Json::toString(call.Status(call.TaskId())["info"]["param"]), R"({"of":{"method":"kept"}})");
+}
+
 TEST_F(TaskStartTest, ParametersStayOutOfTheRecordIfAsked) {
     TaskCall call("alice", kCall);
     call.polling.SetRemoveParam(true);
@@ -277,7 +283,11 @@ TEST_F(TaskStartTest, ARecordThatCannotBeWrittenIsToldByTheLogAlone) {
     EXPECT_FALSE(call.Start(ReportAndEnd));
     EXPECT_EQ(call.Body(), "{}");
     EXPECT_EQ(call.polling.GetError(), 500);
-    EXPECT_EQ(LoggedTimes("Failed to set property."), 2);
+    call.polling.SetPrefixAttr(std::string("test-\0x", 7));
+    EXPECT_FALSE(call.Start(ReportAndEnd));
+    TaskCall other(std::string("alice\0x", 7));
+    EXPECT_FALSE(other.Start(ReportAndEnd));
+    EXPECT_EQ(LoggedTimes("Failed to set property."), 4);
     EXPECT_TRUE(FilesIn(TaskFolder()).empty());
 }
 

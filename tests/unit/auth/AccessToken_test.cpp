@@ -310,6 +310,15 @@ TEST_F(TwoServers, WhatWasInTheOutputBeforeNeverCountsForAServer) {
     ExpectRefusalOf(R"({"scope":"read"})");
 }
 
+TEST_F(TwoServers, AnEmptyTokenIsExchangedLikeAnyOtherAndItsRefusalLoggedOnce) {
+    Json::Value out;
+    device.ServerAnswers("https://one.example/", R"({"scope":"read"})");
+    device.ServerAnswers("https://two.example/", R"({"scope":"read"})");
+    EXPECT_FALSE(APIAuth::ExchangeAccessToken("", out));
+    ExpectRefusalOf(R"({"scope":"read"})");
+    ExpectRefusalOf(R"({"scope":"read"})");
+}
+
 TEST_F(TwoServers, AnExchangeThatFailsLeavesItsOutputAlone) {
     platform.httpServers.clear();
     Json::Value out = J(R"({"old": 1})");

@@ -32,6 +32,16 @@ TEST_F(BearerGate, AGoodTokenRunsTheMethodAsItsUser) {
     EXPECT_EQ(Exchanges(answer), 1);
 }
 
+TEST_F(BearerGate, AServerThatIsALocalApiDoesNotLeaveTheAdministratorBehindAsTheUser) {
+    device.SetServers(R"([{"enabled": true, "params":
+        "api=ZOVA.Test.Good&version=1&method=echo&user=alice&scope=read&t={access_token}",
+        "expect": {"data": {"user": "{userName}", "scope": "{scope}"}}}])");
+    const WebAnswer answer = Serve(WithToken());
+    EXPECT_EQ(answer.body["data"]["user"].asString(), "alice") << answer.child.output;
+    EXPECT_EQ(answer.environment["ZOVA_WEBAPI_USERNAME"].asString(), "alice");
+    EXPECT_FALSE(answer.environment.isMember("USERNAME"));
+}
+
 TEST_F(BearerGate, ATokenAloneCountsAlsoBesideASessionId) {
     const WebAnswer answer = Serve(WithToken("admin-sid"));
     EXPECT_EQ(answer.body["data"]["user"].asString(), "alice");

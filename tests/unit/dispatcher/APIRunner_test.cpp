@@ -2,6 +2,7 @@
 
 #include <cstdlib>
 #include <cstring>
+#include <stdexcept>
 
 #include "ChildRun.h"
 #include "DeviceTest.h"
@@ -28,6 +29,10 @@ protected:
 
 void Callback(void* argument) {
     fake::FakePlatform::Required("callback").Enter("callback", static_cast<const char*>(argument), 0);
+}
+
+void ThrowingCallback(void*) {
+    throw std::runtime_error("line\nbreak");
 }
 
 // ---- construction ----
@@ -233,15 +238,15 @@ protected:
         platform.process.hats = {"DefaultHat"};
     }
 
-    /** Runs two callbacks in the child; gives its calls from the fork on. */
-    Json::Value Run() {
+    /** Runs one callback, and another after it, in the child; gives its calls from the fork on. */
+    Json::Value Run(void (*callback)(void*) = Callback) {
         const unit::ChildResult result = unit::RunInChild(
             "",
             [&] {
                 char first[] = "first";
                 char second[] = "second";
                 TestRunner runner;
-                runner.Response()->SetCallbackFunc(Callback, first);
+                runner.Response()->SetCallbackFunc(callback, first);
                 runner.Response()->SetCallbackFunc(Callback, second);
                 platform.calls.clear();
                 runner.HandleCallback(runner.Response());
@@ -252,6 +257,12 @@ protected:
         return result.report;
     }
 };
+
+TEST_F(CallbackChild, RunsTheOthersAfterOneThatThrows) {
+    ExpectLog(LOG_ERR, "a callback threw: line?break");
+    EXPECT_JSON(Run(ThrowingCallback), R"j(["QLIBCProcFork()", "setsid()", "sleep(1)",
+        "ZOVA_aa_has_profile_restricted()", "callback(second)", "exit(0)"])j");
+}
 
 TEST_F(CallbackChild, RunsTheCallbacksInOrderAndEnds) {
     EXPECT_JSON(Run(), R"j(["QLIBCProcFork()", "setsid()", "sleep(1)", "ZOVA_aa_has_profile_restricted()",

@@ -70,13 +70,15 @@ INSTANTIATE_TEST_SUITE_P(
 // ---- ApplyLibDef ----
 
 TEST_F(DescriptionsTest, DefaultsCompleteADescription) {
+    platform.files["/usr/zova/zovaman/webapi/lib.def"] =
+        R"({"authLevel": 1, "allowUser": ["admin.local", "normal.local"], "priority": 4})";
     TestRunner runner;
     Json::Value description = Minimal();
     EXPECT_EQ(&runner.ApplyLibDef(description), &description);
     EXPECT_EQ(description["authLevel"].asInt(), 1);
     EXPECT_JSON(description["allowUser"], R"(["admin.local", "normal.local"])");
     EXPECT_EQ(description["requestFormat"].asString(), "JSON");
-    EXPECT_EQ(description["priority"].asInt(), 0);
+    EXPECT_EQ(description["priority"].asInt(), 4);
     EXPECT_FALSE(description.isMember("appPriv"));
 }
 
@@ -246,6 +248,16 @@ TEST_F(DescriptionsTest, ACallTouchesOnlyTheFileOfItsAPI) {
     EXPECT_EQ(platform.CountOf("QLIBCFileExist"), 2);
     EXPECT_EQ(platform.CountOf("ReadJsonFile"), 2);
     EXPECT_EQ(platform.CountOf("glob"), 0);
+}
+
+TEST_F(DescriptionsTest, ADescriptionUnderANameThatIsNoneIsNotFoundInAFileThatIsAlreadyRead) {
+    descriptions["ZOVA.Test.Good/../x"] = Good();
+    Install();
+    TestRunner runner;
+    EXPECT_TRUE(CallGood(runner, "success"));
+    EXPECT_FALSE(Call(runner, "ZOVA.Test.Good/../x", 1, "success"));
+    EXPECT_EQ(runner.Response()->GetError(), 102);
+    ExpectLog(LOG_ERR, "WebAPI ZOVA.Test.Good/../x is not valid");
 }
 
 // ---- GetMethod and GetMethodAttr ----

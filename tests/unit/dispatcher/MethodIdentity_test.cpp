@@ -101,6 +101,16 @@ TEST_F(ProcessLibTest, ARefusedGrantByDefaultNeverRunsTheMethod) {
     EXPECT_EQ(platform.CallsOf({"mark"}), (std::vector<std::string>{"mark(GetAPITable)"}));
 }
 
+TEST_F(ProcessLibTest, AMethodWhoseAttributesAreNoObjectRunsWithTheDefaultsLikeOneWithout) {
+    // The defaults say "grantable": without them the identity would be lost for good.
+    Good()["methods"]["1"] = unit::J(R"([{"probe": "text"}])");
+    Install();
+    TestRunner runner;
+    CallAndFindProcessAsBefore(runner, "probe");
+    EXPECT_EQ(platform.CallsOf({"ResetCredentialsByName"}),
+              (std::vector<std::string>{"ResetCredentialsByName(service, keep)"}));
+}
+
 TEST_F(ProcessLibTest, GrantByUserWithoutALoginFailsWith117AndItsLine) {
     TestRunner runner;
     CallAndFindProcessAsBefore(runner, "by_user", false);

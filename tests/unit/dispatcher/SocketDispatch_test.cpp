@@ -174,7 +174,13 @@ TEST_F(SocketTest, WithoutAReasonTheLineGivesNone) {
 TEST_F(SocketTest, TheDaemonGetsRequestAndResponseAndItsAnswerReplacesTheResponse) {
     TestRunner runner;
     runner.Request()->InitSession(J(R"({"username": "alice"})"));
+    runner.Response()->SetHeader("X-Before", "1");
+    runner.Response()->AddCookie("before", "1", "/", 0, "", false, false);
+    runner.Response()->SetServerError("before");
     EXPECT_TRUE(Call(runner, "ZOVA.Test.Good", 1, "success", J(R"({"x": [1]})")));
+    EXPECT_FALSE(runner.Response()->HasHeader("X-Before"));
+    EXPECT_JSON(runner.Response()->GetCookies(), "[]");
+    EXPECT_EQ(runner.Response()->GetServerError(), "");
     EXPECT_JSON(runner.Response()->GetBody(), R"({"success": true, "data": "from the daemon"})");
     EXPECT_EQ(runner.Response()->GetError(), 0);
     EXPECT_EQ(received.getMemberNames(), (Texts{"req", "resp"}));

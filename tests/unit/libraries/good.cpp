@@ -151,6 +151,7 @@ const ZOVA::_tag_API_TABLE table[] = {
     {"ZOVA.Test.Good", 1, "header", SetHeaders},
     {"ZOVA.Test.Good", 1, "restart", AskForRestart},
     {"ZOVA.Test.Good", 1, "silent", AnswerItself},
+    {"ZOVA.Test.Good", 1, "upload_silent", AnswerItself},
     {"ZOVA.Test.Good", 1, "nest", Nest},
     {"ZOVA.Test.Good", 2, "success", Echo},
     {"ZOVA.Test.Other", 1, "success", Echo},

@@ -17,6 +17,7 @@ constexpr const char* kGoodMethods = R"([
     {"keep_input": {"grantable": true, "allowUpload": true}},
     {"upload": {"grantable": true, "allowUpload": true}},
     {"upload_lasting": {"grantByUser": true, "allowUpload": true}},
+    {"upload_silent": {"grantable": true, "allowUpload": true}},
     {"upload_as_root": {"grantByDefault": true, "allowUpload": true}},
     {"upload_deferred": {"grantable": true, "allowUpload": true, "deferUpload": true}},
     {"keep_output": {"grantable": true, "allowDownload": true}}

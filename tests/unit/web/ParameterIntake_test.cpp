@@ -125,6 +125,12 @@ TEST_F(ParameterIntakeTest, ABodyThatCannotBeParsedIs101) {
     EXPECT_EQ(answer.ErrorCode(), 101);
 }
 
+TEST_F(ParameterIntakeTest, ABodyThatMakesTheJsonLibraryThrowIs101AndLogged) {
+    platform.pairsThatThrow = std::string(kEcho) + "&a=1";
+    ExpectLog(LOG_ERR, "thrown for \"" + platform.pairsThatThrow + "\"", "ParameterIntake.cpp");
+    EXPECT_EQ(Serve(WebCall::Post(platform.pairsThatThrow)).ErrorCode(), 101);
+}
+
 TEST_F(ParameterIntakeTest, PostParametersNeedAnObjectOrNothingToFill) {
     unit::TestWebEntry entry;
     entry.Request()->InitEnv(unit::J(R"({"CONTENT_LENGTH": "5"})"));
@@ -179,6 +185,7 @@ TEST_F(ParameterIntakeTest, AnUploadWithACompleteQueryReadsNothingFromStandardIn
     const WebAnswer answer = Serve(Upload("api=ZOVA.Test.Good&version=1&method=success"));
     EXPECT_EQ(answer.ErrorCode(), 115);
     EXPECT_TRUE(answer.CallsOf("fread").empty());
+    EXPECT_TRUE(answer.CallsOf("ZovaCgiLoadUploadNumParams").empty());
     EXPECT_EQ(answer.Header("Content-type"), "text/plain; charset=\"UTF-8\"");
     EXPECT_NE(answer.after["descriptors"]["0"].asString(), "/dev/null");
 }

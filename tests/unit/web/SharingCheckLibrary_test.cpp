@@ -1,5 +1,6 @@
 // The project's check: its library, its table, and the hat and identity under which it runs.
 
+#include <algorithm>
 #include <cstdlib>
 
 #include "SharingTest.h"
@@ -213,6 +214,9 @@ TEST_F(SharingAppCheck, IsANoWithoutATableFunction) {
     Link().projectName = "good";
     EXPECT_FALSE(Check("success"));
     ExpectLog(LOG_ERR, "Get Sharing Check Table Fail");
+    EXPECT_TRUE(std::any_of(platform.process.log.begin(), platform.process.log.end(), [](const fake::LogLine& line) {
+        return line.priority == LOG_DEBUG && line.text.find("cannot load sharing check table: ") == 0;
+    }));
 }
 
 TEST_F(SharingAppCheck, IsANoWithANullTable) {
@@ -300,13 +304,13 @@ TEST_F(SharingTable, RowOfVersion0FitsEveryVersionAndOneOfAnotherVersionIsSkippe
 
 TEST_F(SharingTable, RowWithAnEmptyApiExpressionIsLoggedAndTheWalkGoesOn) {
     EXPECT_EQ(Find({{"", 0, "*", First}, {"*", 0, "*", Second}}), Second);
-    ExpectLog(LOG_WARNING, "warning: empty api regex in sharing_check");
+    ExpectLog(LOG_ERR, "warning: empty api regex in sharing_check");
 }
 
 TEST_F(SharingTable, RowWithAnEmptyMethodExpressionIsLoggedAndTheWalkGoesOn) {
     EXPECT_EQ(Find({{"*", 0, "", First}, {"*", 0, nullptr, First}, {"*", 0, "*", Second}}), Second);
-    ExpectLog(LOG_WARNING, "warning: empty method regex in sharing_check");
-    ExpectLog(LOG_WARNING, "warning: empty method regex in sharing_check");
+    ExpectLog(LOG_ERR, "warning: empty method regex in sharing_check");
+    ExpectLog(LOG_ERR, "warning: empty method regex in sharing_check");
 }
 
 TEST_F(SharingTable, RowOfAnotherApiOrVersionIsPassedWithoutALineAboutItsMethod) {

@@ -57,6 +57,15 @@ TEST_F(UploadIntakeTest, TheFilesAreRemovedWhenTheMethodHasReturned) {
     EXPECT_NE(std::find(returned, answer.calls.end(), Removed().front()), answer.calls.end());
 }
 
+TEST_F(UploadIntakeTest, TheFilesOfAMethodThatAnswersItselfAreRemovedOnceItsCallbacksAreOnTheirWay) {
+    const WebAnswer answer = Serve(Call("upload_silent"));
+    EXPECT_EQ(answer.child.output, "");
+    EXPECT_EQ(answer.CallsOf("unlink"), Removed());
+    const auto forked = std::find(answer.calls.begin(), answer.calls.end(), "QLIBCProcFork()");
+    ASSERT_NE(forked, answer.calls.end());
+    EXPECT_EQ(std::find(answer.calls.begin(), forked, Removed().front()), forked);
+}
+
 TEST_F(UploadIntakeTest, TheFilesGoToTheUserThatTheMethodRunsAs) {
     EXPECT_EQ(Serve(Call("upload")).CallsOf("lchown"),
               (std::vector<std::string>{"lchown(/tmp/part-1, 500, 50)", "lchown(/tmp/part-2, 500, 50)"}));

@@ -296,6 +296,14 @@ TEST_P(CredentialParameters, RewriteCookieHeaderAndVariables) {
     }
 }
 
+TEST_F(WebEntryTest, TheEnvironmentIsTakenInOnceUnlessAParameterStandsInForACookie) {
+    // Each time it is, the link that it names is looked up.
+    const WebCall call = GoodCall("success").With("HTTP_X_FAKE_SHARING", "link");
+    EXPECT_EQ(Serve(call).CallsOf("EntryDB::GetByHash").size(), 1U);
+    const std::string query = "api=ZOVA.Test.Good&version=1&method=success&_sid=X";
+    EXPECT_EQ(Serve(WebCall(call).With("QUERY_STRING", query)).CallsOf("EntryDB::GetByHash").size(), 2U);
+}
+
 INSTANTIATE_TEST_SUITE_P(
     Rows, CredentialParameters,
     ::testing::Values(CredentialCase{"NoneLeavesTheCookieHeaderUntouched", "", "a=1", "a=1", nullptr, nullptr, 1},
