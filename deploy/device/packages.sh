@@ -4,7 +4,7 @@
 BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libcurl4-openssl-dev)
 DEVICE_PACKAGES=(lighttpd busybox curl libcurl4 media-types python3)
 TEST_PACKAGES=(libgtest-dev openssl nodejs)
-CHECK_PACKAGES=(clang-format-14 clang-tidy shellcheck)
+CHECK_PACKAGES=(clang-14 clang-format-14 clang-tidy shellcheck)
 export BUILD_PACKAGES DEVICE_PACKAGES TEST_PACKAGES CHECK_PACKAGES
 
 as_root() {
