@@ -34,7 +34,7 @@ def main():
     results = sys.argv[1]
     filtered = len(sys.argv) > 2 and sys.argv[2] != ""
     parts = [of_ctest(f"{results}/ctest.xml", filtered), of_unittest(f"{results}/machine"),
-             of_unittest(f"{results}/device")]
+             of_unittest(f"{results}/device"), of_unittest(f"{results}/peers")]
     passed = sum(part[0] for part in parts)
     failed = sum(part[1] for part in parts)
     print(f"{passed} passed, {failed} failed")
