@@ -17,7 +17,7 @@ constexpr const char* kTimeout = "relay_timeout";
 
 /** What a relayed call is made of, beside its parameters. */
 struct RelayedCall {
-    explicit RelayedCall(const APIRequest& request)
+    explicit RelayedCall(APIRequest& request)
         : api(request.GetAPIClass()),
           version(request.GetAPIVersion()),
           method(request.GetAPIMethod()),

@@ -24,7 +24,8 @@ public:
     int Queue(const char* function, long peer, const std::string& call) {
         FakePlatform& platform = FakePlatform::Required(function);
         const auto found = platform.peers.find(peer);
-        const std::string text = Shown(peer) + ", " + call + ", " + Shown(getenv("ZOVA_WEBAPI_USERNAME"));
+        const char* user = getenv("ZOVA_WEBAPI_USERNAME");
+        const std::string text = Shown(peer) + ", " + call + ", " + Shown(user);
         if (!platform.Enter(function, text, EIO) || found == platform.peers.end()) {
             return -1;
         }

@@ -3,13 +3,14 @@
 #pragma GCC visibility pop
 
 #include <curl/curl.h>
+#include <strings.h>
 
 #include <algorithm>
-#include <cstring>
 #include <ctime>
 #include <initializer_list>
 #include <memory>
 #include <string>
+#include <string_view>
 
 namespace {
 
@@ -17,6 +18,9 @@ constexpr long kConnectSeconds = 10;
 /** How long the peer may take none of the request that is being sent. */
 constexpr time_t kStallSeconds = 60;
 constexpr size_t kLargestHeaderBlock = 65536;
+
+constexpr std::string_view kProtocol = "HTTP/";
+constexpr std::string_view kInterim = "HTTP/1.1 1";
 
 using Handle = std::unique_ptr<CURL, decltype(&curl_easy_cleanup)>;
 using Lines = std::unique_ptr<curl_slist, decltype(&curl_slist_free_all)>;
@@ -38,6 +42,8 @@ struct Exchange {
     curl_off_t sent = 0;
     size_t headerBytes = 0;
     bool answerBegun = false;
+    /** Whether the answer says where it ends. */
+    bool isFramed = false;
     /** Why a function below ended the transfer. */
     ZovaHttpsResult stopped = ZOVA_HTTPS_GOOD;
 };
@@ -60,6 +66,16 @@ size_t Read(char* buffer, size_t size, size_t count, void* data) {
     return static_cast<size_t>(got);
 }
 
+/** Whether the header line names a length or a coding with an end of its own. */
+bool SaysWhereItEnds(std::string_view line) {
+    constexpr std::string_view kLength = "content-length:";
+    constexpr std::string_view kCoding = "transfer-encoding:";
+    const auto begins = [&](std::string_view name) {
+        return line.size() > name.size() && strncasecmp(line.data(), name.data(), name.size()) == 0;
+    };
+    return begins(kLength) || (begins(kCoding) && line.find("chunked") != std::string_view::npos);
+}
+
 size_t WriteHeader(char* line, size_t size, size_t count, void* data) {
     auto& exchange = *static_cast<Exchange*>(data);
     const size_t length = size * count;
@@ -68,10 +84,12 @@ size_t WriteHeader(char* line, size_t size, size_t count, void* data) {
         return 0;
     }
     exchange.headerBytes += length;
-    constexpr char kInterim[] = "HTTP/1.1 1";
-    constexpr size_t kInterimSize = sizeof(kInterim) - 1;
-    exchange.answerBegun = exchange.answerBegun || (length > kInterimSize && memcmp(line, "HTTP/", 5) == 0 &&
-                                                    memcmp(line, kInterim, kInterimSize) != 0);
+    const std::string_view text(line, length);
+    if (text.substr(0, kProtocol.size()) == kProtocol) {
+        exchange.answerBegun = text.substr(0, kInterim.size()) != kInterim;
+        exchange.isFramed = false;
+    }
+    exchange.isFramed = exchange.isFramed || SaysWhereItEnds(text);
     return length;
 }
 
@@ -209,5 +227,6 @@ int ZovaHttpsPost(const ZovaHttpsRequest* request, long* status) {
     if (code == CURLE_OK && curl_easy_getinfo(handle.get(), CURLINFO_RESPONSE_CODE, status) != CURLE_OK) {
         return ZOVA_HTTPS_FAILED;
     }
-    return ResultOf(code);
+    // An end of the connection alone may be anybody's doing: libcurl does not ask for the closing word of TLS.
+    return code == CURLE_OK && !exchange.isFramed ? ZOVA_HTTPS_BROKEN : ResultOf(code);
 }
