@@ -14,7 +14,6 @@
 #include "zovacredential/RelayForm.h"
 #include "zovacredential/RelayRequest.h"
 
-using reference::RelayCall;
 using reference::RelayError;
 using reference::RelayRequest;
 

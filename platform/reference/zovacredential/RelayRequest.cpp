@@ -3,7 +3,6 @@
 #include <syslog.h>
 
 #include <algorithm>
-#include <cstring>
 #include <exception>
 
 #include "Paths.h"
@@ -30,8 +29,7 @@ long Read(void* context, char* buffer, size_t size) {
     auto& transfer = *static_cast<Transfer*>(context);
     const std::string& body = transfer.request.body.text;
     if (transfer.bodySent < body.size()) {
-        const size_t piece = std::min(size, body.size() - transfer.bodySent);
-        memcpy(buffer, body.data() + transfer.bodySent, piece);
+        const size_t piece = body.copy(buffer, size, transfer.bodySent);
         transfer.bodySent += piece;
         return static_cast<long>(piece);
     }

@@ -11,6 +11,7 @@ by a signal, or after ten minutes.
     /empty      200 and no body     /interim    100 and 103 before the answer of /echo
     /largest    16 MiB              /large      a byte more
     /endless    bytes without end   /drip       a byte every tenth of a second without end
+    /pause      the answer of /echo after 3 s
     /slow       nothing for 30 s    /headers    header lines without end
     /garbage    no HTTP             /close      nothing at all
     /short      less than announced /chunk      a chunked body without its end
@@ -142,8 +143,10 @@ class Handler(socketserver.BaseRequestHandler):
             self.request.sendall(self.count())
             return
         echo = self.echo()
+        if path == "/pause":
+            time.sleep(3)
         answers = {
-            "/echo": echo, "/empty": answer(b""), "/status": answer(b'{"success":true}', "500 Sorry"),
+            "/echo": echo, "/pause": echo, "/empty": answer(b""), "/status": answer(b'{"success":true}', "500 Sorry"),
             "/redirect": answer(b"", "302 Found", "Location: /echo\r\n"),
             "/interim": b"HTTP/1.1 100 Continue\r\n\r\nHTTP/1.1 103 Early Hints\r\nLink: <x>\r\n\r\n" + echo,
             "/largest": answer(b"x" * (16 * MEBI)), "/large": answer(b"x" * (16 * MEBI + 1)),
