@@ -240,6 +240,7 @@ TEST_F(Relay, AnAnswerBeforeTheEndOfAnUploadCounts) {
     const Outcome outcome = Upload("/early", stream.Get(), Headers(std::to_string(body.size())));
     EXPECT_TRUE(outcome.IsGood()) << outcome;
     EXPECT_EQ(outcome.answer, "{\"early\":true}");
+    EXPECT_LT(outcome.seconds, 4.0) << "nothing more is sent";
 }
 
 TEST_F(Relay, RequestsRunInTheirOrderAndOnce) {

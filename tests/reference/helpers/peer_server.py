@@ -16,7 +16,7 @@ by a signal, or after ten minutes.
     /garbage    no HTTP             /close      nothing at all
     /short      less than announced /chunk      a chunked body without its end
     /cut        a body without a length, and an end that TLS does not confirm
-    /early      the answer before the body is read, which it never is
+    /early      the answer before the body, which is never read; the connection stays open for 5 s
     /gone       the connection ends before the body is read
 """
 
@@ -133,8 +133,8 @@ class Handler(socketserver.BaseRequestHandler):
         self.read_head()
         path = self.target.partition("?")[0]
         if path == "/early":
-            self.request.sendall(answer(b'{"early":true}'))
-            time.sleep(2)
+            self.request.sendall(b'HTTP/1.1 200 OK\r\nContent-Length: 14\r\n\r\n{"early":true}')
+            time.sleep(5)
             return
         if path == "/gone":
             os.close(self.request.detach())
