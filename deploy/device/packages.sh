@@ -1,7 +1,8 @@
 # shellcheck shell=bash
 # Names of the Debian packages that each step needs, and their installation. To be sourced.
 
-BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libcurl4-openssl-dev)
+BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libsqlite3-dev
+    libcurl4-openssl-dev)
 DEVICE_PACKAGES=(lighttpd lighttpd-mod-openssl busybox curl libcurl4 media-types openssl python3)
 TEST_PACKAGES=(libgtest-dev nodejs)
 CHECK_PACKAGES=(clang-format-14 clang-tidy shellcheck)
