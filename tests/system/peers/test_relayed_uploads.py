@@ -158,7 +158,7 @@ class Large(UploadsTestCase):
         self.assertLess(large_here, small_here + MOST_DIFFERENCE_KIB)
         # The sanitizers keep memory of their own.
         if not host.is_sanitized():
-            self.assertLess(large_here, 40 * 1024)
+            self.assertLess(large_here, 24 * 1024)
 
     def test_an_upload_that_the_peer_refuses_is_its_answer(self):
         def change(table):
