@@ -1,9 +1,10 @@
 # shellcheck shell=bash
 # Names of the Debian packages that each step needs, and their installation. To be sourced.
 
-BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libcurl4-openssl-dev)
-DEVICE_PACKAGES=(lighttpd busybox curl libcurl4 media-types python3)
-TEST_PACKAGES=(libgtest-dev openssl nodejs)
+BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libsqlite3-dev
+    libcurl4-openssl-dev)
+DEVICE_PACKAGES=(lighttpd lighttpd-mod-openssl busybox curl libcurl4 media-types openssl python3)
+TEST_PACKAGES=(libgtest-dev nodejs)
 CHECK_PACKAGES=(clang-14 clang-format-14 clang-tidy shellcheck)
 export BUILD_PACKAGES DEVICE_PACKAGES TEST_PACKAGES CHECK_PACKAGES
 

@@ -99,7 +99,12 @@ public:
     /** 0 if the expression is "*" or matches anywhere in the text; another number else, also for a malformed one. */
     int RegexMatch(const char* regex, const char* text);
 
-    /** Passes the call on to a peer device. */
+    /**
+     * Passes the call on to the peer device of "relay_zn" and writes the peer's answer as the body. The call must be
+     * described here too and its caller be logged in; what the caller may do is the peer's to say. Error in the
+     * response if not: as from admission and login, 109 if the peer could not be asked. Logs a failure of the
+     * transport.
+     */
     bool ProcessRelay(APIRequest* request, APIResponse* response);
 
 private:

@@ -30,6 +30,7 @@ const char kAccessTokenDirectory[] = ZOVA_REFERENCE_ROOT "/var/lib/zova/access-t
 const char kMimeTypes[] = ZOVA_REFERENCE_ROOT "/etc/mime.types";
 const char kSharingDirectory[] = ZOVA_REFERENCE_ROOT "/var/lib/zova/sharing";
 const char kSharingDatabase[] = ZOVA_REFERENCE_ROOT "/var/lib/zova/sharing/sharing.db";
+const char kPeers[] = ZOVA_REFERENCE_ROOT "/etc/zova/peers.json";
 const char kVolumes[] = ZOVA_REFERENCE_ROOT "/etc/zova/volumes.json";
 const char kGroupDirectory[] = ZOVA_REFERENCE_ROOT "/var/lib/zova/groups";
 const char* const kPamDirectory = sizeof(ZOVA_REFERENCE_ROOT) > 1 ? ZOVA_REFERENCE_ROOT "/etc/pam.d" : nullptr;

@@ -19,6 +19,7 @@ extern const char kDeviceSecret[];
 extern const char kAppPrivileges[];
 extern const char kWebServer[];
 extern const char kVolumes[];
+extern const char kPeers[];
 
 extern const char kDeviceInformation[];
 /** What is to become the file above. One name for all writers: the next of them removes what a killed one left. */
@@ -39,5 +40,6 @@ extern const char kModuleDirectory[];
 constexpr const char* kCryptoModule = "zova-crypto.so";
 constexpr const char* kLoginModule = "zova-login.so";
 constexpr const char* kSqliteModule = "zova-sqlite.so";
+constexpr const char* kHttpsModule = "zova-https.so";
 
 }  // namespace reference::paths

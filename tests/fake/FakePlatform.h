@@ -155,6 +155,10 @@ public:
     std::vector<Connection> connections;
     int openConnections = 0;
     std::uint16_t httpsPort = 5001;
+    /** What peer devices answer, by number; others are unknown. */
+    std::map<long, std::string> peers;
+    /** What a failed relay tells as its reason. */
+    int relayError = 0;
     /** What answers at an URL; any other cannot be reached. */
     std::map<std::string, HttpAnswer> httpServers;
     std::vector<HttpRequest> httpRequests;

@@ -52,8 +52,8 @@ size_t Count(const std::string& text, const std::string& part) {
 TEST(LinkedProgram, MapsOneObjectForAllNamesAndNoCipherOrLoginLibrary) {
     const std::string mapped = LinkProbeLine("start");
     EXPECT_EQ(Count(mapped, "libzova") + Count(mapped, "libwebapi"), 1u) << mapped;
-    for (const char* library :
-         {"libcrypto", "libssl", "libpam", "libcurl", "libsqlite", "zova-crypto", "zova-login", "zova-sqlite"}) {
+    for (const char* library : {"libcrypto", "libssl", "libpam", "libcurl", "libsqlite", "zova-crypto", "zova-login",
+                                "zova-sqlite", "zova-https"}) {
         EXPECT_EQ(Count(mapped, library), 0u) << library;
     }
 }

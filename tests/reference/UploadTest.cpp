@@ -102,6 +102,26 @@ protected:
 
 }  // namespace
 
+TEST(UploadBody, TellsWhichDelimiterStandsBeforeTheRest) {
+    std::string text = kGood;
+    FILE* stream = fmemopen(text.data(), text.size(), "r");
+    UploadBody body(stream, text.size(), "multipart/form-data; boundary=b", nullptr);
+    body.SetExact(true);
+    EXPECT_EQ(body.DelimiterBeforeRest(), "") << "nothing was read";
+    EXPECT_EQ(body.Next(), UploadBody::Event::kField);
+    EXPECT_EQ(body.DelimiterBeforeRest() + text.substr(static_cast<size_t>(ftell(stream))),
+              kGood.substr(kGood.find("--b", 3)));
+    fclose(stream);
+
+    std::string last = kGood.substr(0, kGood.find("--b", 3)) + "--b--\r\n";
+    stream = fmemopen(last.data(), last.size(), "r");
+    UploadBody end(stream, last.size(), "multipart/form-data; boundary=b", nullptr);
+    end.SetExact(true);
+    EXPECT_EQ(end.Next(), UploadBody::Event::kField);
+    EXPECT_EQ(end.DelimiterBeforeRest() + last.substr(static_cast<size_t>(ftell(stream))), "--b--\r\n");
+    fclose(stream);
+}
+
 TEST_F(Upload, StoresFilesUnderRandomNamesAndKeepsTheLastOfAField) {
     InUpload(kGood, std::to_string(kGood.size()), [&]() -> std::string {
         Hash params;

@@ -33,8 +33,8 @@ def of_counts(path):
 def main():
     results = sys.argv[1]
     filtered = len(sys.argv) > 2 and sys.argv[2] != ""
-    parts = [of_ctest(f"{results}/ctest.xml", filtered), of_counts(f"{results}/gtest"), of_counts(f"{results}/machine"),
-             of_counts(f"{results}/device")]
+    parts = [of_ctest(f"{results}/ctest.xml", filtered)]
+    parts += [of_counts(f"{results}/{part}") for part in ("gtest", "machine", "device", "peers")]
     passed = sum(part[0] for part in parts)
     failed = sum(part[1] for part in parts)
     print(f"{passed} passed, {failed} failed")

@@ -55,6 +55,8 @@ public:
     std::string_view Data() const { return data; }
     /** Null until an error. */
     const char* Problem() const { return problem; }
+    /** Whether the last delimiter was taken. */
+    bool IsAtEnd() const { return state == State::kEnd; }
     /** Whether the error is one of number or length. */
     bool IsTooLarge() const { return tooLarge; }
 

@@ -87,6 +87,10 @@ UploadBody::Event UploadBody::Next() {
     return event;
 }
 
+std::string UploadBody::DelimiterBeforeRest() const {
+    return bytesRead == 0 ? "" : "--" + boundary + (decoder.IsAtEnd() ? "--" : "\r\n");
+}
+
 UploadBody::Event UploadBody::NextOfSlice() {
     switch (sliceState) {
         case SliceState::kBegin:

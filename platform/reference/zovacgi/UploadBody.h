@@ -47,6 +47,8 @@ public:
     const std::string& Value() const { return slice ? sliceFile : decoder.Value(); }
     std::string_view Data() const { return slice ? sliceData : decoder.Data(); }
     const std::string& Boundary() const { return boundary; }
+    /** The delimiter that was read behind a field and has to stand before the rest to make it a body again. */
+    std::string DelimiterBeforeRest() const;
     uint64_t BytesRead() const { return bytesRead; }
     uint64_t Length() const { return length; }
     ZovaCgiUploadStatus Status() const { return status; }

@@ -165,6 +165,7 @@ const ZOVA::_tag_API_TABLE kTable[] = {
     {kAPI, 1, "write_lasting", Write},
     {kAPI, 1, "answer_long", AnswerLong},
     {kAPI, 1, "start_task", StartTask},
+    {kAPI, 1, "params", probe::TellUpload},
     {kAPI, 1, "upload", probe::TellUpload},
     {kAPI, 1, "upload_lasting", probe::TellUpload},
     {kAPI, 1, "upload_deferred", probe::TakeUpload},

@@ -134,12 +134,6 @@ TEST_F(WebEntryTest, ARefusedThreadNameAnswers118AndRunsNothing) {
     ExpectLog(LOG_ERR, "Set process name fail[Bad address]", "ProcessIdentity.cpp");
 }
 
-TEST_F(WebEntryTest, ARelayParameterAnswers109) {
-    const WebAnswer answer = Serve(WebCall::Get("api=ZOVA.Test.Good&version=1&method=success&relay_zn=peer"));
-    EXPECT_EQ(answer.ErrorCode(), 109);
-    EXPECT_TRUE(answer.CallsOf("mark").empty());
-}
-
 TEST_F(WebEntryTest, ASharingLinkToAMethodThatDoesNotAllowThemIsRefusedWith126) {
     const WebAnswer answer = Serve(GoodCall("success").With("HTTP_X_FAKE_SHARING", "hash"));
     EXPECT_EQ(answer.ErrorCode(), 126);
