@@ -1,8 +1,8 @@
 # shellcheck shell=bash
 # Names of the Debian packages that each step needs, and their installation. To be sourced.
 
-BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libcurl4-openssl-dev)
-DEVICE_PACKAGES=(lighttpd busybox curl libcurl4 media-types python3)
+BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libcurl4-openssl-dev libarchive-dev)
+DEVICE_PACKAGES=(lighttpd busybox curl libcurl4 libarchive13 media-types python3)
 TEST_PACKAGES=(libgtest-dev openssl nodejs)
 CHECK_PACKAGES=(clang-format-14 clang-tidy shellcheck)
 export BUILD_PACKAGES DEVICE_PACKAGES TEST_PACKAGES CHECK_PACKAGES
