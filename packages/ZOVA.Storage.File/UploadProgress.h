@@ -24,6 +24,8 @@ public:
 
     /** Starts the task. @param prefix of its id. @return false if that failed; the log says why. */
     bool Start(ZOVA::APIRequest* request, const std::string& prefix);
+    /** Between start and end. */
+    bool IsRunning() const { return channel.IsOpen(); }
     /** Full id of the task. */
     const std::string& TaskId() const { return taskId; }
 
