@@ -244,10 +244,11 @@ class Archives(DownloadTestCase):
         data = reader.rest()
         with tarfile.open(fileobj=io.BytesIO(data)) as tar:
             self.assertEqual(3003, len(tar.getnames()))
+        reader.close()
         reader = Reader(self.alice, paths=[f"{PLACE}/large"])
+        self.addCleanup(reader.close)
         process, = device.hosts_running()
         self.assertNotIn("libarchive", maps_of(process))
-        reader.close()
 
     def test_without_the_library_the_answer_says_so(self):
         library = os.path.realpath(glob.glob("/usr/lib/*/libarchive.so.13")[0])
