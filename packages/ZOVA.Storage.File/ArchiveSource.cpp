@@ -2,7 +2,6 @@
 
 #include <errno.h>
 #include <fcntl.h>
-#include <string.h>
 #include <sys/stat.h>
 #include <time.h>
 #include <unistd.h>
@@ -30,9 +29,9 @@ constexpr char kShorter[] = "got shorter while it was read; its end is zeros";
 
 }  // namespace
 
-ArchiveSource::ArchiveSource(const ArchiveLibrary& functions, ArchiveFormat format, const Reader& reader,
+ArchiveSource::ArchiveSource(const ArchiveLibrary& functions, ArchiveFormat format, const Viewer& asker,
                              std::vector<ArchiveItem> items)
-    : writer(functions, format), viewer(reader), wanted(std::move(items)) {}
+    : writer(functions, format), viewer(asker), wanted(std::move(items)) {}
 
 long ArchiveSource::Read(char* buffer, std::size_t size) {
     std::string& output = writer.Output();
@@ -46,8 +45,7 @@ long ArchiveSource::Read(char* buffer, std::size_t size) {
             return -1;
         }
     }
-    const std::size_t count = std::min(size, output.size() - taken);
-    memcpy(buffer, output.data() + taken, count);
+    const std::size_t count = output.copy(buffer, size, taken);
     taken += count;
     return static_cast<long>(count);
 }

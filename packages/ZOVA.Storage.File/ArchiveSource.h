@@ -8,7 +8,7 @@
 #include "../common/UniqueFd.h"
 #include "ArchiveWriter.h"
 #include "FolderNames.h"
-#include "Reader.h"
+#include "Viewer.h"
 
 namespace package {
 
@@ -30,8 +30,8 @@ class ArchiveSource {
 public:
     static constexpr char kNoteName[] = "not-in-this-archive.txt";
 
-    /** @param reader says what may be seen; it and `functions` must outlive the source. */
-    ArchiveSource(const ArchiveLibrary& functions, ArchiveFormat format, const Reader& reader,
+    /** @param asker says what may be seen; it and `functions` must outlive the source. */
+    ArchiveSource(const ArchiveLibrary& functions, ArchiveFormat format, const Viewer& asker,
                   std::vector<ArchiveItem> items);
 
     /** The next bytes. @return their number, 0 at the end, -1 if the archive cannot go on. */
@@ -55,7 +55,7 @@ private:
     void LeaveOut(const std::string& path, const char* reason);
 
     ArchiveWriter writer;
-    const Reader& viewer;
+    const Viewer& viewer;
     std::vector<ArchiveItem> wanted;
     std::size_t nextItem = 0;
     std::vector<Level> levels;

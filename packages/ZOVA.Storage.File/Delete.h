@@ -9,8 +9,8 @@ namespace package {
 constexpr char kDeletePrefix[] = "delete-";
 
 /**
- * "delete": removes "paths", one or up to 1,000. With "recursive" (default false) folders with all that is in them, in a
- * background task; without, files, links and empty folders at once.
+ * "delete": removes "paths", one or up to 1,000. With "recursive" (default false) folders with all that is in them, in
+ * a background task; without, files, links and empty folders at once.
  *
  * Answers data.results with "path" and "error" for each, the call being a success only if all are removed; or
  * data.task_id, and the task reports what `RemovalState::ToJson` tells, at once and every half second. Nothing is

@@ -16,8 +16,8 @@
 #include "ArchiveSource.h"
 #include "Attachment.h"
 #include "ClientPath.h"
-#include "Reader.h"
 #include "Requests.h"
+#include "Viewer.h"
 
 namespace package {
 namespace {
@@ -34,14 +34,14 @@ struct StreamEnd {
 using Stream = std::unique_ptr<FILE, StreamEnd>;
 
 /** Opens for reading what is a file or a folder. */
-FileError OpenContent(const Reader& reader, const std::string& path, UniqueFd& out, struct stat& status) {
+FileError OpenContent(const Viewer& viewer, const std::string& path, UniqueFd& out, struct stat& status) {
     // A device is looked at and not opened.
-    FileError error = reader.Open(path, O_PATH | O_NOFOLLOW, out, status);
+    FileError error = viewer.Open(path, O_PATH | O_NOFOLLOW, out, status);
     if (error == FILE_OK && !S_ISREG(status.st_mode) && !S_ISDIR(status.st_mode)) {
         error = FILE_ERR_WRONG_KIND;
     }
     if (error == FILE_OK) {
-        error = reader.Open(path, O_RDONLY, out, status);
+        error = viewer.Open(path, O_RDONLY, out, status);
     }
     return error == FILE_OK && !S_ISREG(status.st_mode) && !S_ISDIR(status.st_mode) ? FILE_ERR_WRONG_KIND : error;
 }
@@ -84,7 +84,7 @@ ssize_t ReadArchive(void* source, char* buffer, size_t size) {
     return count;
 }
 
-void SendArchive(ZOVA::APIResponse* response, const Reader& reader, const std::vector<std::string>& paths, int format) {
+void SendArchive(ZOVA::APIResponse* response, const Viewer& viewer, const std::vector<std::string>& paths, int format) {
     const ArchiveLibrary* library = ArchiveLibrary::Get();
     if (library == nullptr) {
         Refuse(response, FILE_ERR_NO_ARCHIVER);
@@ -95,7 +95,7 @@ void SendArchive(ZOVA::APIResponse* response, const Reader& reader, const std::v
     for (const std::string& path : paths) {
         items.push_back({path, OwnName(NameOf(path), taken)});
     }
-    ArchiveSource source(*library, static_cast<ArchiveFormat>(format), reader, std::move(items));
+    ArchiveSource source(*library, static_cast<ArchiveFormat>(format), viewer, std::move(items));
     const Stream stream(fopencookie(&source, "r", {ReadArchive, nullptr, nullptr, nullptr}));
     if (stream == nullptr) {
         Refuse(response, ErrorOf(errno, "making an archive"));
@@ -109,16 +109,16 @@ void SendArchive(ZOVA::APIResponse* response, const Reader& reader, const std::v
 void Answer(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
     std::vector<std::string> paths;
     int format = kNoFormat;
-    Reader reader;
+    Viewer viewer;
     if (!ReadPaths(request, response, paths) || !ReadWord(request, response, "format", kFormats, format) ||
-        !reader.Begin(request, response, paths)) {
+        !viewer.Begin(request, response, paths)) {
         return;
     }
     Results results;
     for (const std::string& path : paths) {
         UniqueFd thing;
         struct stat status;
-        results.Add(path, OpenContent(reader, path, thing, status));
+        results.Add(path, OpenContent(viewer, path, thing, status));
         if (results.FirstError() != FILE_OK) {
             results.Answer(response);
             return;
@@ -128,7 +128,7 @@ void Answer(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
             return;
         }
     }
-    SendArchive(response, reader, paths, format == kNoFormat ? 0 : format);
+    SendArchive(response, viewer, paths, format == kNoFormat ? 0 : format);
 }
 
 }  // namespace

@@ -22,8 +22,7 @@ bool LinkFence::Admit(const ZOVA::APIRequest* request, const std::vector<std::st
 
 bool LinkFence::IsAdmitted(const std::string& path, const struct stat& status) const {
     const auto found = admitted.find(path);
-    return found != admitted.end() && found->second == std::make_pair(status.st_dev, status.st_ino) &&
-           IsShared(status);
+    return found != admitted.end() && found->second == std::make_pair(status.st_dev, status.st_ino) && IsShared(status);
 }
 
 bool LinkFence::IsShared(const struct stat& status) const {

@@ -10,8 +10,8 @@
 #include "../common/Parameters.h"
 #include "ClientPath.h"
 #include "Listing.h"
-#include "Reader.h"
 #include "Requests.h"
+#include "Viewer.h"
 
 namespace package {
 namespace {
@@ -51,21 +51,21 @@ void AnswerPage(ZOVA::APIResponse* response, const std::string& path, const List
 }
 
 /** The entries of a page as they are now. */
-Json::Value Described(const std::vector<ListedEntry>& page, int folder, const std::string& path, const Reader& reader) {
+Json::Value Described(const std::vector<ListedEntry>& page, int folder, const std::string& path, const Viewer& viewer) {
     Json::Value entries(Json::arrayValue);
     for (const ListedEntry& entry : page) {
         struct stat status;
-        if (fstatat(folder, entry.name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && reader.MaySee(status)) {
-            entries.append(EntryJson(Join(path, entry.name), status, reader.View()));
+        if (fstatat(folder, entry.name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0 && viewer.MaySee(status)) {
+            entries.append(EntryJson(Join(path, entry.name), status, viewer.View()));
         }
     }
     return entries;
 }
 
 void ListTop(ZOVA::APIRequest* request, ZOVA::APIResponse* response, const ListOrder& order) {
-    Reader reader;
+    Viewer viewer;
     std::vector<std::string> paths;
-    if (!reader.BeginAtTop(request, response, paths)) {
+    if (!viewer.BeginAtTop(request, response, paths)) {
         return;
     }
     std::vector<Json::Value> rows;
@@ -73,14 +73,14 @@ void ListTop(ZOVA::APIRequest* request, ZOVA::APIResponse* response, const ListO
         UniqueFd opened;
         struct stat status;
         // What cannot be reached, a home that was never made for instance, is none.
-        if (reader.Open(paths[at], O_PATH | O_NOFOLLOW, opened, status) != FILE_OK) {
+        if (viewer.Open(paths[at], O_PATH | O_NOFOLLOW, opened, status) != FILE_OK) {
             continue;
         }
-        Json::Value row = EntryJson(paths[at], status, reader.View());
-        if (!reader.IsVisitor()) {
-            row["name"] = reader.Account().folders[at].name;
+        Json::Value row = EntryJson(paths[at], status, viewer.View());
+        if (!viewer.IsVisitor()) {
+            row["name"] = viewer.Account().folders[at].name;
             row.removeMember("name_bytes");
-            row["writable"] = reader.Account().folders[at].writable;
+            row["writable"] = viewer.Account().folders[at].writable;
         }
         rows.push_back(std::move(row));
     }
@@ -102,31 +102,31 @@ void List(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
         ListTop(request, response, order);
         return;
     }
-    Reader reader;
-    if (!reader.Begin(request, response, {path})) {
+    Viewer viewer;
+    if (!viewer.Begin(request, response, {path})) {
         return;
     }
     UniqueFd opened;
     struct stat status;
-    FileError error = reader.Open(path, O_RDONLY | O_DIRECTORY, opened, status);
+    FileError error = viewer.Open(path, O_RDONLY | O_DIRECTORY, opened, status);
     if (error != FILE_OK) {
         Refuse(response, error);
         return;
     }
     FolderNames folder(std::move(opened));
     ListPage page(order);
-    error = folder.IsOpen() ? ReadFolder(folder, reader, order, page) : ErrorOf(errno, "reading a folder");
+    error = folder.IsOpen() ? ReadFolder(folder, viewer, order, page) : ErrorOf(errno, "reading a folder");
     if (error != FILE_OK) {
         Refuse(response, error);
         return;
     }
-    AnswerPage(response, path, order, page.Total(), Described(page.Take(), folder.Get(), path, reader));
+    AnswerPage(response, path, order, page.Total(), Described(page.Take(), folder.Get(), path, viewer));
 }
 
 void Stat(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
     std::vector<std::string> paths;
-    Reader reader;
-    if (!ReadPaths(request, response, paths) || !reader.Begin(request, response, paths)) {
+    Viewer viewer;
+    if (!ReadPaths(request, response, paths) || !viewer.Begin(request, response, paths)) {
         return;
     }
     Json::Value data(Json::objectValue);
@@ -134,9 +134,9 @@ void Stat(ZOVA::APIRequest* request, ZOVA::APIResponse* response) {
     for (const std::string& path : paths) {
         UniqueFd opened;
         struct stat status;
-        const FileError error = reader.Open(path, O_PATH | O_NOFOLLOW, opened, status);
+        const FileError error = viewer.Open(path, O_PATH | O_NOFOLLOW, opened, status);
         results.Add(path, error,
-                    error == FILE_OK ? EntryJson(path, status, reader.View()) : Json::Value(Json::objectValue));
+                    error == FILE_OK ? EntryJson(path, status, viewer.View()) : Json::Value(Json::objectValue));
     }
     data["results"] = results.Rows();
     response->SetSuccess(data);

@@ -53,20 +53,19 @@ void ListPage::Add(ListedEntry entry) {
 }
 
 std::vector<ListedEntry> ListPage::Take() {
-    std::sort_heap(kept.begin(), kept.end(), [this](const ListedEntry& one, const ListedEntry& other) {
-        return StandsBefore(one, other);
-    });
+    std::sort_heap(kept.begin(), kept.end(),
+                   [this](const ListedEntry& one, const ListedEntry& other) { return StandsBefore(one, other); });
     const std::size_t first = std::min(wanted.offset, kept.size());
     kept.erase(kept.begin(), kept.begin() + static_cast<std::ptrdiff_t>(first));
     return std::move(kept);
 }
 
-FileError ReadFolder(FolderNames& folder, const Reader& reader, const ListOrder& order, ListPage& page) {
+FileError ReadFolder(FolderNames& folder, const Viewer& viewer, const ListOrder& order, ListPage& page) {
     while (const dirent* entry = folder.Next()) {
         std::int64_t value = 0;
-        if (!IsToldByFolder(order.key, entry, value) || reader.IsVisitor()) {
+        if (!IsToldByFolder(order.key, entry, value) || viewer.IsVisitor()) {
             struct stat status;
-            if (fstatat(folder.Get(), entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0 || !reader.MaySee(status)) {
+            if (fstatat(folder.Get(), entry->d_name, &status, AT_SYMLINK_NOFOLLOW) != 0 || !viewer.MaySee(status)) {
                 continue;
             }
             value = ValueOf(order.key, status);

@@ -10,7 +10,7 @@
 #include "EntryJson.h"
 #include "FileErrors.h"
 #include "FolderNames.h"
-#include "Reader.h"
+#include "Viewer.h"
 
 namespace package {
 
@@ -53,7 +53,7 @@ private:
     std::uint64_t total = 0;
 };
 
-/** Reads a folder into a page. What vanishes meanwhile, and what the reader may not see, is left out. */
-FileError ReadFolder(FolderNames& folder, const Reader& reader, const ListOrder& order, ListPage& page);
+/** Reads a folder into a page. What vanishes meanwhile, and what the viewer may not see, is left out. */
+FileError ReadFolder(FolderNames& folder, const Viewer& viewer, const ListOrder& order, ListPage& page);
 
 }  // namespace package

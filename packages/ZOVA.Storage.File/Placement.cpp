@@ -46,8 +46,8 @@ bool Settle(int file, const Arrival& arrival) {
 
 /** Renames where both lie in one file system; otherwise EXDEV. */
 int RenameInto(int from, const std::string& name, int folder, const std::string& newName, bool overwrites) {
-    const int result =
-        renameat2(from, name.c_str(), folder, newName.c_str(), overwrites ? 0U : static_cast<unsigned>(RENAME_NOREPLACE));
+    const int result = renameat2(from, name.c_str(), folder, newName.c_str(),
+                                 overwrites ? 0U : static_cast<unsigned>(RENAME_NOREPLACE));
     if (result == 0 || overwrites || errno != EINVAL) {
         return result;
     }
@@ -71,9 +71,10 @@ bool Copy(int from, int to, std::uint64_t size) {
 FileError CopyInto(int folder, const struct stat& above, int part, const Placed& placed, const Arrival& arrival,
                    bool overwrites) {
     const std::string hidden = HiddenName();
-    const UniqueFd copy(hidden.empty() ? -1
-                                       : openat(folder, hidden.c_str(),
-                                                O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, S_IRUSR | S_IWUSR));
+    const UniqueFd copy(
+        hidden.empty()
+            ? -1
+            : openat(folder, hidden.c_str(), O_WRONLY | O_CREAT | O_EXCL | O_NOFOLLOW | O_CLOEXEC, S_IRUSR | S_IWUSR));
     if (!copy.IsOpen()) {
         return ErrorOf(errno, "making a file");
     }

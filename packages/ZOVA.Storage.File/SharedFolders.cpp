@@ -44,9 +44,9 @@ bool ReadNames(const Json::Value& list, std::vector<std::string>& out) {
 }
 
 bool ReadAccess(const Json::Value& access, AccessList& out) {
-    return access.isNull() || (HasOnly(access, {"users", "groups"}) &&
-                               ReadNames(Json::member(access, "users"), out.users) &&
-                               ReadNames(Json::member(access, "groups"), out.groups));
+    return access.isNull() ||
+           (HasOnly(access, {"users", "groups"}) && ReadNames(Json::member(access, "users"), out.users) &&
+            ReadNames(Json::member(access, "groups"), out.groups));
 }
 
 bool ReadFolder(const Json::Value& entry, SharedFolder& out) {
@@ -76,9 +76,8 @@ std::optional<std::vector<SharedFolder>> ParseSharedFolders(const Json::Value& t
     std::vector<SharedFolder> folders;
     for (const Json::Value& entry : list) {
         SharedFolder folder;
-        if (!ReadFolder(entry, folder) || std::any_of(folders.begin(), folders.end(), [&](const SharedFolder& other) {
-                return Meet(folder, other);
-            })) {
+        if (!ReadFolder(entry, folder) || std::any_of(folders.begin(), folders.end(),
+                                                      [&](const SharedFolder& other) { return Meet(folder, other); })) {
             return std::nullopt;
         }
         folders.push_back(folder);

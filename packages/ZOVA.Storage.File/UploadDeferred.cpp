@@ -36,8 +36,7 @@ struct Going {
 Going* going = nullptr;
 
 void Tell(unsigned long long taken, unsigned long long length) {
-    if (going == nullptr || going->isStopped || !going->progress.IsRunning() ||
-        going->progress.Tell(taken, length)) {
+    if (going == nullptr || going->isStopped || !going->progress.IsRunning() || going->progress.Tell(taken, length)) {
         return;
     }
     going->isStopped = true;

@@ -1,4 +1,4 @@
-#include "Reader.h"
+#include "Viewer.h"
 
 #include <errno.h>
 
@@ -6,7 +6,7 @@
 
 namespace package {
 
-bool Reader::BecomeCaller(ZOVA::APIResponse* response) const {
+bool Viewer::BecomeCaller(ZOVA::APIResponse* response) const {
     if (!TakeIdentity(*caller)) {
         response->SetError(ZOVA::WEBAPI_ERR_INTERNAL, Json::Value());
         return false;
@@ -14,7 +14,7 @@ bool Reader::BecomeCaller(ZOVA::APIResponse* response) const {
     return true;
 }
 
-bool Reader::Begin(const ZOVA::APIRequest* request, ZOVA::APIResponse* response,
+bool Viewer::Begin(const ZOVA::APIRequest* request, ZOVA::APIResponse* response,
                    const std::vector<std::string>& paths) {
     caller = &CurrentCaller();
     isVisitor = request->IsSharing();
@@ -28,7 +28,7 @@ bool Reader::Begin(const ZOVA::APIRequest* request, ZOVA::APIResponse* response,
     return isAdmitted;
 }
 
-bool Reader::BeginAtTop(const ZOVA::APIRequest* request, ZOVA::APIResponse* response, std::vector<std::string>& paths) {
+bool Viewer::BeginAtTop(const ZOVA::APIRequest* request, ZOVA::APIResponse* response, std::vector<std::string>& paths) {
     caller = &CurrentCaller();
     isVisitor = request->IsSharing();
     if (isVisitor) {
@@ -45,7 +45,7 @@ bool Reader::BeginAtTop(const ZOVA::APIRequest* request, ZOVA::APIResponse* resp
     return BecomeCaller(response);
 }
 
-FileError Reader::Open(const std::string& path, int flags, UniqueFd& out, struct stat& status) const {
+FileError Viewer::Open(const std::string& path, int flags, UniqueFd& out, struct stat& status) const {
     const FileError error = OpenThing(*caller, path, flags, out);
     if (error != FILE_OK) {
         return error;

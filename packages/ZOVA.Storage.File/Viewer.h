@@ -19,7 +19,7 @@ namespace package {
  * Reading for an account, or for a visitor of a link in the name of the link's owner, who then reads what the link
  * shares and nothing else. The process runs as that account afterwards, for good.
  */
-class Reader {
+class Viewer {
 public:
     /**
      * Takes the identity. Where a visitor asks for something that is not shared nothing of it is opened.
@@ -37,7 +37,7 @@ public:
 
     /** Opens one of the paths and says what it is. @param flags as for `OpenBeneath`. */
     FileError Open(const std::string& path, int flags, UniqueFd& out, struct stat& status) const;
-    /** Whether this reader may see what lies below an opened folder. */
+    /** Whether this viewer may see what lies below an opened folder. */
     bool MaySee(const struct stat& status) const { return !isVisitor || fence.IsShared(status); }
 
 private:
