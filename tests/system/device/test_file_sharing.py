@@ -115,6 +115,32 @@ class FileSharing(files.FilesTestCase):
                 self.assertEqual(127, self.call("list", visitor, path=path).code())
         self.assertEqual(0, self.reaches(visitor))
 
+    def test_the_method_keeps_to_the_link_by_itself_where_nobody_asks_the_check(self):
+        description = f"{device.FOLDER}/{API}.lib"
+        with open(description, encoding="utf-8") as file:
+            text = file.read()
+        self.addCleanup(self.replace, description, text)
+        self.replace(description, text.replace('"allowSharing": true', '"allowSharing": true, "skipSharingAppCheck": true'))
+        visitor = self.visitor()
+        os.symlink("photo.jpg", f"{ALBUM}/link")
+        files.write(f"{ALBUM}/admins")
+        files.give("admin", f"{ALBUM}/admins")
+        os.chmod(f"{ALBUM}/admins", 0o644)
+        for path in OUTSIDE + (f"{ALBUM}/link", f"{ALBUM}/admins"):
+            with self.subTest(path[:60]):
+                # What is no path at all is told before anything else.
+                codes = {401, 402}
+                self.assertIn(self.read(visitor, path), codes)
+                self.assertIn(self.download(visitor, ALBUM, path).code(), codes)
+                self.assertIn(self.call("stat", visitor, paths=[PHOTO, path]).code(), codes)
+                self.assertIn(self.call("list", visitor, path=path).code(), codes)
+        self.assertEqual(0, self.reaches(visitor))
+
+    @staticmethod
+    def replace(path, text):
+        with open(path, "w", encoding="utf-8") as file:
+            file.write(text)
+
     def test_what_lies_there_but_is_not_the_owners_is_neither_listed_nor_packed(self):
         visitor = self.visitor()
         os.symlink("/etc/passwd", f"{ALBUM}/link")
