@@ -21,7 +21,7 @@ bool IsThere(int folder, const std::string& name) {
     return fstatat(folder, name.c_str(), &status, AT_SYMLINK_NOFOLLOW) == 0;
 }
 
-/** Hidden, and so long that no name can be made of it that is too long. */
+/** Hidden, and of random digits, so that nobody has taken it. */
 std::string HiddenName() {
     std::uint64_t random[2] = {};
     if (getrandom(random, sizeof(random), 0) != static_cast<ssize_t>(sizeof(random))) {

@@ -1,7 +1,5 @@
 #include "Requests.h"
 
-#include <string.h>
-
 #include <utility>
 
 #include "../common/Parameters.h"

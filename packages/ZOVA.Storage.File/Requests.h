@@ -3,8 +3,6 @@
 #include <webapi/APIRequest.h>
 #include <webapi/APIResponse.h>
 
-#include <cstdint>
-#include <optional>
 #include <string>
 #include <vector>
 

@@ -41,7 +41,7 @@ private:
     Json::Value times{Json::objectValue};
 };
 
-/** A row of an upload's results. @param path where the file was to go, "" where that is not known. */
+/** What an upload's results tell of the file of a form field, beside its path and error. */
 Json::Value UploadRow(const std::string& field, const Placed& placed);
 
 }  // namespace package
