@@ -2,8 +2,8 @@
 # Names of the Debian packages that each step needs, and their installation. To be sourced.
 
 BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libsqlite3-dev
-    libcurl4-openssl-dev)
-DEVICE_PACKAGES=(lighttpd lighttpd-mod-openssl busybox curl libcurl4 media-types openssl python3)
+    libcurl4-openssl-dev libarchive-dev)
+DEVICE_PACKAGES=(lighttpd lighttpd-mod-openssl busybox curl libarchive13 libcurl4 media-types openssl python3)
 TEST_PACKAGES=(libgtest-dev nodejs)
 CHECK_PACKAGES=(clang-14 clang-format-14 clang-tidy shellcheck)
 export BUILD_PACKAGES DEVICE_PACKAGES TEST_PACKAGES CHECK_PACKAGES

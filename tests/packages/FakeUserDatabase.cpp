@@ -71,6 +71,17 @@ passwd* getpwent() {
 
 void endpwent() {}
 
+int getgrnam_r(const char* name, group* out, char*, size_t, group** found) {
+    *found = nullptr;
+    for (const auto& [gid, known] : FakeUserDatabase::Instance().groups) {
+        if (known == name) {
+            out->gr_gid = gid;
+            *found = out;
+        }
+    }
+    return 0;
+}
+
 int getgrgid_r(gid_t gid, group* out, char*, size_t size, group** found) {
     const FakeUserDatabase& fake = FakeUserDatabase::Instance();
     *found = nullptr;

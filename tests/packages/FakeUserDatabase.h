@@ -8,7 +8,7 @@
 #include <vector>
 
 /**
- * The user database under `getpwnam_r`, `getpwent`, `getgrgid_r` and `getgrouplist` of the test program, with state
+ * The user database under `getpwnam_r`, `getpwent`, `getgrgid_r`, `getgrnam_r` and `getgrouplist` of the test program, with state
  * that a test sets.
  */
 struct FakeUserDatabase {

@@ -67,7 +67,8 @@ TEST_P(PackageLibrary, HidesItsOwnFunctions) {
 INSTANTIATE_TEST_SUITE_P(Rows, PackageLibrary,
                          testing::Values("ZOVA.Core.OAuth.Scope", "ZOVA.Core.OAuth.Server", "ZOVA.Core.Session",
                                          "ZOVA.Core.Sharing", "ZOVA.Core.Sharing.Visit", "ZOVA.Core.System",
-                                         "ZOVA.Core.Task", "ZOVA.Core.Token", "ZOVA.Core.User", "ZOVA.Storage.Search"),
+                                         "ZOVA.Core.Task", "ZOVA.Core.Token", "ZOVA.Core.User", "ZOVA.Storage.File",
+                                         "ZOVA.Storage.Search"),
                          [](const testing::TestParamInfo<const char*>& row) {
                              const std::string name = row.param;
                              return name.substr(name.rfind('.') + 1);
