@@ -8,8 +8,8 @@
 #include <vector>
 
 /**
- * The user database under `getpwnam_r`, `getpwent`, `getgrgid_r`, `getgrnam_r` and `getgrouplist` of the test program, with state
- * that a test sets.
+ * The user database under `getpwnam_r`, `getpwent`, `getgrgid_r`, `getgrnam_r` and `getgrouplist` of the test program,
+ * with state that a test sets.
  */
 struct FakeUserDatabase {
     struct Entry {

@@ -90,6 +90,17 @@ class Uploads(UploadTestCase):
         self.assertEqual({"first".encode(): b"a", "zweite ö".encode(): b"b", b"{third}": b"c"}, files.tree(PLACE))
         self.assertEqual(5, os.stat(f"{PLACE}/zweite ö").st_mtime)
 
+    def test_the_call_may_be_named_by_the_first_fields_and_a_file_may_come_as_a_slice(self):
+        body = form(part("api", files.API.encode()), part("version", b"1"), part("method", b"upload"),
+                    part("path", PLACE.encode()), part("name", b"form"), part("file", b"one", "x"))
+        headers = {**self.alice.headers(), "Content-Type": f"multipart/form-data; boundary={files.BOUNDARY}"}
+        self.assertEqual(0, webclient.request("POST", "", body, headers).code())
+        headers = {**self.alice.headers(), "Content-Type": "application/octet-stream", "X-Type-Name": "SLICEUPLOAD"}
+        for method, parameters in (("upload", {"name": "slice"}), ("upload_deferred", {"name": "late", "ticket": "t"})):
+            answer = webclient.request("POST", files.query(method, path=PLACE, **parameters), b"two", headers)
+            self.assertEqual(0, answer.code(), answer.body)
+        self.assertEqual({b"form": b"one", b"slice": b"two", b"late": b"two"}, files.tree(PLACE))
+
     def test_what_is_there_is_refused_skipped_or_overwritten(self):
         files.write(f"{PLACE}/there", b"old")
         files.give("alice", f"{PLACE}/there")

@@ -112,6 +112,24 @@ class Listing(files.FilesTestCase):
         self.assertEqual(119, self.call("list", webclient.Client()).code())
 
 
+class Batches(files.FilesTestCase):
+    def batch(self, client, *entries):
+        calls = [{"api": files.API, "version": 1, **entry} for entry in entries]
+        answer = client.call("ZOVA.Entry.Request", "request", post=True, compound=json.dumps(calls)).json()
+        return [row.get("error", {}).get("code", row.get("data")) for row in answer["data"]["result"]]
+
+    def test_each_call_of_a_batch_runs_as_the_user_whatever_the_one_before_became(self):
+        rows = self.batch(self.alice, {"method": "list", "path": PLACE},
+                          {"method": "mkdir", "path": f"{PLACE}/new"}, {"method": "stat", "paths": f"{PLACE}/new"},
+                          {"method": "list", "path": "/home/admin"}, {"method": "mkdir", "path": "/etc/new"},
+                          {"method": "download", "paths": PLACE})
+        self.assertEqual(0, rows[0]["total"])
+        self.assertEqual({"path": f"{PLACE}/new"}, rows[1])
+        self.assertEqual("folder", rows[2]["results"][0]["type"])
+        self.assertEqual([402, 402, 113], rows[3:])
+        self.assertEqual(pwd.getpwnam("alice").pw_uid, os.stat(f"{PLACE}/new").st_uid)
+
+
 class Looking(files.FilesTestCase):
     def test_several_paths_are_each_told_or_refused(self):
         files.write(f"{PLACE}/a")
