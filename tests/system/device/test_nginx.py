@@ -1,0 +1,80 @@
+"""Nginx with the settings that the project ships: all that holds behind the device's own web server, and its own sending
+of files."""
+
+import unittest
+
+import servercases
+import test_bad_input
+import test_downloads
+import test_uploads
+import test_web_server
+import webserver
+
+
+class Served(webserver.ServedTestCase):
+    server_type = webserver.Nginx
+    # See `servercases.LateAnswers`.
+    answers_early = False
+
+
+class NginxExchange(Served, servercases.Exchange):
+    pass
+
+
+class NginxLateAnswers(Served, servercases.LateAnswers):
+    pass
+
+
+class NginxSecrets(Served, servercases.Secrets):
+    pass
+
+
+class NginxPlaces(Served, test_web_server.Places):
+    pass
+
+
+class NginxHostProcess(Served, test_web_server.HostProcess):
+    pass
+
+
+class NginxParallel(Served, test_web_server.Parallel):
+    pass
+
+
+class NginxBadInput(Served, test_bad_input.BadInputThroughTheWebServer):
+    pass
+
+
+class NginxStored(Served, test_uploads.Stored):
+    pass
+
+
+class NginxLarge(Served, test_uploads.Large):
+    pass
+
+
+class NginxRefused(Served, test_uploads.Refused):
+    pass
+
+
+class NginxDeferred(Served, test_uploads.Deferred):
+    pass
+
+
+class NginxBrokenOffUploads(Served, test_uploads.BrokenOffUploads):
+    pass
+
+
+class NginxDownloads(Served, test_downloads.Downloads):
+    # One line reaches the client, the last one.
+    types = ["video/mp4"]
+
+
+class NginxFastDownloads(Served, test_downloads.FastDownloads):
+    types = ["video/mp4"]
+    # nginx passes on of the other lines what its settings name.
+    own_header = []
+
+
+if __name__ == "__main__":
+    unittest.main()
