@@ -17,6 +17,8 @@ namespace reference {
 
 namespace {
 
+constexpr std::string_view kSendfile = "X-Sendfile";
+
 /** Read at the first question; what a method sets afterwards holds for the process. */
 std::optional<bool> isEnabled;
 
@@ -82,7 +84,7 @@ bool IsTheSameForAll(const std::string& path, const struct stat& file) {
 }  // namespace
 
 FastOutput ReadFastOutput(std::string_view header, std::string_view location) {
-    if (header == "X-Sendfile") {
+    if (header == kSendfile) {
         return {std::string(header), ""};
     }
     if (header == "X-Accel-Redirect" && IsLocation(location)) {
@@ -103,7 +105,12 @@ std::string FastOutputLine(int file) {
         return "";
     }
     const FastOutput& device = DeviceFastOutput();
-    return device.header + ": " + device.location + PercentText(path, "/");
+    const std::string text = PercentText(path, "/");
+    // Some web servers take the path of this header as it stands, others decode it.
+    if (device.header == kSendfile && text != path) {
+        return "";
+    }
+    return device.header + ": " + device.location + text;
 }
 
 }  // namespace reference

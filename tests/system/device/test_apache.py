@@ -3,12 +3,15 @@ of files."""
 
 import unittest
 
+import bad_input
 import servercases
 import test_bad_input
 import test_downloads
 import test_uploads
 import test_web_server
 import webserver
+
+setUpModule = test_bad_input.setUpModule
 
 
 class Served(webserver.ServedTestCase):
@@ -42,7 +45,8 @@ class ApacheParallel(Served, test_web_server.Parallel):
 
 
 class ApacheBadInput(Served, test_bad_input.BadInputThroughTheWebServer):
-    pass
+    # Those that a web server could stumble over itself.
+    rows = bad_input.SIZES + bad_input.CUT_BODIES
 
 
 class ApacheStored(Served, test_uploads.Stored):
@@ -50,7 +54,7 @@ class ApacheStored(Served, test_uploads.Stored):
 
 
 class ApacheLarge(Served, test_uploads.Large):
-    pass
+    large = 100 << 20
 
 
 class ApacheRefused(Served, test_uploads.Refused):
@@ -68,10 +72,13 @@ class ApacheBrokenOffUploads(Served, test_uploads.BrokenOffUploads):
 class ApacheDownloads(Served, test_downloads.Downloads):
     # One line reaches the client, the last one.
     types = ["video/mp4"]
+    # Apache judges the conditions once more, and each of them by itself.
+    tag_beside_date = 412
 
 
 class ApacheFastDownloads(Served, test_downloads.FastDownloads):
     types = ["video/mp4"]
+    tag_beside_date = 412
 
 
 if __name__ == "__main__":

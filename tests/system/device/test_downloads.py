@@ -64,6 +64,10 @@ class Reader:
 class Downloads(webserver.ServedTestCase):
     # The line of the response, which a method replaces if it wants another, comes first; the last one counts.
     types = ['application/json; charset="UTF-8"', "video/mp4"]
+    # The date does not count beside the tag.
+    tag_beside_date = 200
+    # What the web server adds to a type that the method does not set itself.
+    charset = ""
     # What the method sets beside the file's lines.
     own_header = ["header"]
 
@@ -111,7 +115,7 @@ class Downloads(webserver.ServedTestCase):
     def test_a_stream_arrives_whole_as_octet_stream(self):
         response = get("stream", path=self.path)
         self.assertEqual(self.content, response.body)
-        self.assertEqual("application/octet-stream", response.values("Content-Type")[-1])
+        self.assertEqual("application/octet-stream" + self.charset, response.values("Content-Type")[-1])
         self.assertEqual([], response.values("Content-Disposition"))
 
     def test_what_a_program_writes_arrives_whole_although_its_length_is_not_known(self):
@@ -120,7 +124,8 @@ class Downloads(webserver.ServedTestCase):
         self.assertEqual("".join(f"{number}\n" for number in range(1, 200_001)).encode(), response.body)
 
     def test_a_head_has_the_lines_of_a_get_and_no_content(self):
-        lines = [sorted((name, value) for name, value in get(verb=verb, path=self.path).headers if name != "Date")
+        other = ("Date",) if self.own_header else ("Date", "X-Probe")
+        lines = [sorted((name, value) for name, value in get(verb=verb, path=self.path).headers if name not in other)
                  for verb in ("GET", "HEAD")]
         self.assertEqual(*lines)
         self.assertEqual(b"", get(verb="HEAD", path=self.path).body)
@@ -203,13 +208,14 @@ class Downloads(webserver.ServedTestCase):
                                 ({"If-Match": '"x"'}, 412), ({"If-Unmodified-Since": date}, 200),
                                 ({"If-Unmodified-Since": before}, 412),
                                 ({"If-None-Match": '"x"', "If-Modified-Since": date}, 200),
-                                ({"If-Match": tag, "If-Unmodified-Since": before}, 200),
+                                ({"If-Match": tag, "If-Unmodified-Since": before}, self.tag_beside_date),
                                 ({"If-Match": '"x"', "If-None-Match": tag}, 412)):
             with self.subTest(headers):
                 response = get(path=self.path, headers=headers)
                 self.assertEqual(status, response.status)
                 self.assertEqual(len(self.content) if status == 200 else 0, len(response.body))
-                self.assertEqual([] if status == 412 else [tag], response.values("ETag"))
+                if status != 412:
+                    self.assertEqual([tag], response.values("ETag"))
 
     # ---- names ----
 

@@ -3,12 +3,15 @@ of files."""
 
 import unittest
 
+import bad_input
 import servercases
 import test_bad_input
 import test_downloads
 import test_uploads
 import test_web_server
 import webserver
+
+setUpModule = test_bad_input.setUpModule
 
 
 class Served(webserver.ServedTestCase):
@@ -42,7 +45,8 @@ class NginxParallel(Served, test_web_server.Parallel):
 
 
 class NginxBadInput(Served, test_bad_input.BadInputThroughTheWebServer):
-    pass
+    # Those that a web server could stumble over itself.
+    rows = bad_input.SIZES + bad_input.CUT_BODIES
 
 
 class NginxStored(Served, test_uploads.Stored):
@@ -50,7 +54,7 @@ class NginxStored(Served, test_uploads.Stored):
 
 
 class NginxLarge(Served, test_uploads.Large):
-    pass
+    large = 100 << 20
 
 
 class NginxRefused(Served, test_uploads.Refused):
@@ -66,12 +70,14 @@ class NginxBrokenOffUploads(Served, test_uploads.BrokenOffUploads):
 
 
 class NginxDownloads(Served, test_downloads.Downloads):
-    # One line reaches the client, the last one.
-    types = ["video/mp4"]
+    # One line reaches the client, the last one with the character set of the first.
+    charset = "; charset=UTF-8"
+    types = ["video/mp4" + charset]
 
 
 class NginxFastDownloads(Served, test_downloads.FastDownloads):
-    types = ["video/mp4"]
+    charset = "; charset=UTF-8"
+    types = ["video/mp4" + charset]
     # nginx passes on of the other lines what its settings name.
     own_header = []
 

