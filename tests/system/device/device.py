@@ -26,10 +26,10 @@ PROJECT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.dirname(os.pat
 PASSED_OVER = (LOGS, FAILURES, PROJECT)
 
 
-def watched_files():
+def watched_files(tops=WATCHED):
     """Path, kind, size and time of change of all that a call could write, as a set of tuples."""
     found = set()
-    for top in WATCHED:
+    for top in tops:
         for folder, folders, files in os.walk(top):
             if folder in PASSED_OVER:
                 folders.clear()

@@ -48,8 +48,8 @@ def setUpModule():
     unittest.addModuleCleanup(browser.close)
 
 
-class Browser(webserver.ServedTestCase):
-    """From a page of the web server, whichever that is."""
+class PageTestCase(webserver.ServedTestCase):
+    """From a page of the web server."""
 
     @classmethod
     def setUpClass(cls):
@@ -77,6 +77,10 @@ class Browser(webserver.ServedTestCase):
         self.addCleanup(os.unlink, path)
         return path
 
+
+class Browser(PageTestCase):
+    """Through each web server."""
+
     def test_a_form_with_chosen_files_arrives_as_the_user_filled_it_in(self):
         paths = [self.make(name, name.encode()) for name in ("first \u00e4.txt", "second.txt")]
         browser.run(FORM, self.url(test_uploads.query("upload")), "a note \u20ac")
@@ -96,23 +100,6 @@ class Browser(webserver.ServedTestCase):
         for step, name in zip(steps, NAMES, strict=True):
             self.assertEqual(name, step["file"]["text"])
             self.assertRegex(step["file"]["path"], r"\A[a-z/]*/zova-upload-[0-9a-f]{32}\Z")
-
-    def test_names_that_are_too_long_are_refused(self):
-        for field, name in (("f", "x" * 491), ("f" * 64, "x")):
-            answer = browser.run(SEND, self.url(test_uploads.query("upload")), [[field, name, "x"]])
-            self.assertEqual({"code": 108, "errors": {"upload_err": -5}}, answer["error"])
-
-    def test_a_thousand_files_in_one_form_arrive_and_one_more_is_refused(self):
-        files = [[f"file{number}", f"{number}.txt", str(number)] for number in range(1001)]
-        told = browser.run(SEND, self.url(test_uploads.query("upload")), files[:1000])["data"]["files"]
-        self.assertEqual({name: text for name, _, text in files[:1000]},
-                         {name: file["text"] for name, file in told.items()})
-        answer = browser.run(SEND, self.url(test_uploads.query("upload")), files)
-        self.assertEqual({"code": 108, "errors": {"upload_err": -5}}, answer["error"])
-
-    def test_an_empty_file_is_a_file(self):
-        told = browser.run(SEND, self.url(test_uploads.query("upload")), [["file", "empty", ""]])["data"]
-        self.assertEqual(0, told["files"]["file"]["size"])
 
     def test_what_a_page_uploads_has_the_same_digest_on_the_device(self):
         # A rename works within one file system, and uploads lie in /tmp here.
@@ -137,6 +124,27 @@ class Browser(webserver.ServedTestCase):
         query = test_downloads.query(path=self.make("x.bin", b"x"), type="text/x-probe")
         self.assertIn(browser.run(DIGEST, self.url(query), {})[3], ("text/x-probe", "text/x-probe, text/x-probe"))
 
+
+class Limits(PageTestCase):
+    """What is the same behind each web server."""
+
+    def test_names_that_are_too_long_are_refused(self):
+        for field, name in (("f", "x" * 491), ("f" * 64, "x")):
+            answer = browser.run(SEND, self.url(test_uploads.query("upload")), [[field, name, "x"]])
+            self.assertEqual({"code": 108, "errors": {"upload_err": -5}}, answer["error"])
+
+    def test_a_thousand_files_in_one_form_arrive_and_one_more_is_refused(self):
+        files = [[f"file{number}", f"{number}.txt", str(number)] for number in range(1001)]
+        told = browser.run(SEND, self.url(test_uploads.query("upload")), files[:1000])["data"]["files"]
+        self.assertEqual({name: text for name, _, text in files[:1000]},
+                         {name: file["text"] for name, file in told.items()})
+        answer = browser.run(SEND, self.url(test_uploads.query("upload")), files)
+        self.assertEqual({"code": 108, "errors": {"upload_err": -5}}, answer["error"])
+
+    def test_an_empty_file_is_a_file(self):
+        told = browser.run(SEND, self.url(test_uploads.query("upload")), [["file", "empty", ""]])["data"]
+        self.assertEqual(0, told["files"]["file"]["size"])
+
     def test_the_browser_keeps_a_file_under_the_name_that_it_was_told(self):
         for name, kept in (("r\u00e9sum\u00e9 \u20ac.txt", "r\u00e9sum\u00e9 \u20ac.txt"), ("plain.csv", "plain.csv")):
             with self.subTest(name):
@@ -144,7 +152,8 @@ class Browser(webserver.ServedTestCase):
                 query = test_downloads.query(path=self.make(name, content))
                 browser.run("location.href = arguments[0];", self.url(query))
                 path = f"{browser.downloads}/{kept}"
-                device.wait_for(lambda path=path: os.path.exists(path), "the file")
+                device.wait_for(lambda path=path, size=len(content): os.path.exists(path) and os.path.getsize(path) == size,
+                                "the file")
                 with open(path, "rb") as file:
                     self.assertEqual(content, file.read())
                 os.unlink(path)
