@@ -121,8 +121,7 @@ TEST_F(FastFileOutput, IsNotForWhatAnotherThanRootCanExchange) {
     EXPECT_EQ(FastLine(AnswerOf(file)), "/etc/fast-output-test/a-b");
     const std::string linked = "/etc/fast-output-link";
     ASSERT_TRUE(symlink(folder.c_str(), linked.c_str()) == 0 || errno == EEXIST);
-    EXPECT_EQ(FastLine(AnswerOf(linked + "/a-b")), "/etc/fast-output-test/a-b")
-        << "where the folder really lies";
+    EXPECT_EQ(FastLine(AnswerOf(linked + "/a-b")), "/etc/fast-output-test/a-b") << "where the folder really lies";
 
     const auto sendsItself = [&](const char* why) {
         const Sent sent = AnswerOf(file);

@@ -20,6 +20,8 @@ URL = os.environ["WEBAPI_URL"]
 PASSWORD = os.environ["WEBAPI_PASSWORD"]
 
 WATCHED = ("/etc", "/home", "/root", "/run", "/tmp", "/usr/lib/zova", "/usr/zova", "/var")
+# Of these, what a call of a shipped package or of the probe could write: soon looked through.
+WRITTEN = ("/etc/zova", "/home", "/run", "/tmp", "/usr/zova", "/var/lib/zova", "/var/tmp")
 # The project may lie under a watched folder, and with it the layer that the device itself is kept in.
 PROJECT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.dirname(os.path.abspath(__file__)))))
 # Logs, and the counts of login attempts, are written whatever the call.

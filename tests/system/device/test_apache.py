@@ -4,6 +4,7 @@ of files."""
 import unittest
 
 import bad_input
+import device
 import servercases
 import test_bad_input
 import test_downloads
@@ -47,6 +48,7 @@ class ApacheParallel(Served, test_web_server.Parallel):
 class ApacheBadInput(Served, test_bad_input.BadInputThroughTheWebServer):
     # Those that a web server could stumble over itself.
     rows = bad_input.SIZES + bad_input.CUT_BODIES
+    watched = device.WRITTEN
 
 
 class ApacheStored(Served, test_uploads.Stored):
@@ -70,6 +72,7 @@ class ApacheBrokenOffUploads(Served, test_uploads.BrokenOffUploads):
 
 
 class ApacheDownloads(Served, test_downloads.Downloads):
+    large = 100 << 20
     # One line reaches the client, the last one.
     types = ["video/mp4"]
     # Apache judges the conditions once more, and each of them by itself.
@@ -77,6 +80,7 @@ class ApacheDownloads(Served, test_downloads.Downloads):
 
 
 class ApacheFastDownloads(Served, test_downloads.FastDownloads):
+    large = 100 << 20
     types = ["video/mp4"]
     tag_beside_date = 412
 

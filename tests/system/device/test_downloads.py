@@ -62,6 +62,7 @@ class Reader:
 
 
 class Downloads(webserver.ServedTestCase):
+    large = 300 << 20
     # The line of the response, which a method replaces if it wants another, comes first; the last one counts.
     types = ['application/json; charset="UTF-8"', "video/mp4"]
     # The date does not count beside the tag.
@@ -259,7 +260,7 @@ class Downloads(webserver.ServedTestCase):
 
     def test_a_large_file_needs_little_memory_and_no_room_on_the_disk(self):
         path = self.make("large", b"")
-        size = 300 * 1024 * 1024
+        size = self.large
         os.truncate(path, size)
         reader = Reader(query(path=path))
         reader.read(1_000_000)
@@ -276,8 +277,8 @@ class Downloads(webserver.ServedTestCase):
                 peak = peak_memory(host)
         reader.close()
         expected = hashlib.sha256()
-        for _ in range(300):
-            expected.update(bytes(1024 * 1024))
+        for _ in range(size >> 20):
+            expected.update(bytes(1 << 20))
         self.assertEqual((0, expected.digest()), (left, digest.digest()))
         self.assertGreater(peak, 0)
         self.assertLess(peak, 100 * 1024 * 1024)
@@ -317,7 +318,7 @@ class FastDownloads(Downloads):
 
     def test_a_large_file_needs_little_memory_and_no_room_on_the_disk(self):
         path = self.make("large", b"")
-        size = 300 * 1024 * 1024
+        size = self.large
         os.truncate(path, size)
         reader = Reader(query(path=path))
         reader.read(1_000_000)

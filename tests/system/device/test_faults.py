@@ -29,8 +29,6 @@ KILLED_AT = ("openat", "write", "fchmod", "flock", "linkat", "unlink", "newfstat
 # Under the sanitizers, which take their time, one in so many is met.
 SANITIZED_STEP = 15
 BEGINNING = re.compile(rb"(?:[^\r\n\0]+: [^\r\n\0]*\r\n)+(\r\n)?", re.DOTALL)
-# What a call could write, in a device that is otherwise at rest.
-PLACES = ("/etc/zova", "/home", "/run", "/tmp", "/usr/zova", "/var/lib/zova", "/var/tmp")
 
 
 def traced(environment, body, *options):
@@ -149,7 +147,7 @@ class Faults:
 
     def state(self):
         """Of the sessions their names: a use of one shows in its file."""
-        return {entry[0] if entry[0].startswith(device.SESSIONS) else entry for entry in device.watched_files(PLACES)}
+        return {entry[0] if entry[0].startswith(device.SESSIONS) else entry for entry in device.watched_files(device.WRITTEN)}
 
 
 class UploadFaults(Faults, probe.ProbeTestCase):
@@ -220,7 +218,7 @@ class SharingVisitFaults(SharingFaults):
     def state(self):
         """The database grows with the visits."""
         self.assertEqual(0, self.opened(self.link).read().code())
-        return {entry[0] for entry in device.watched_files(PLACES)}
+        return {entry[0] for entry in device.watched_files(device.WRITTEN)}
 
 
 if __name__ == "__main__":

@@ -4,6 +4,7 @@ of files."""
 import unittest
 
 import bad_input
+import device
 import servercases
 import test_bad_input
 import test_downloads
@@ -47,6 +48,7 @@ class NginxParallel(Served, test_web_server.Parallel):
 class NginxBadInput(Served, test_bad_input.BadInputThroughTheWebServer):
     # Those that a web server could stumble over itself.
     rows = bad_input.SIZES + bad_input.CUT_BODIES
+    watched = device.WRITTEN
 
 
 class NginxStored(Served, test_uploads.Stored):
@@ -70,12 +72,14 @@ class NginxBrokenOffUploads(Served, test_uploads.BrokenOffUploads):
 
 
 class NginxDownloads(Served, test_downloads.Downloads):
+    large = 100 << 20
     # One line reaches the client, the last one with the character set of the first.
     charset = "; charset=UTF-8"
     types = ["video/mp4" + charset]
 
 
 class NginxFastDownloads(Served, test_downloads.FastDownloads):
+    large = 100 << 20
     charset = "; charset=UTF-8"
     types = ["video/mp4" + charset]
     # nginx passes on of the other lines what its settings name.
