@@ -23,7 +23,7 @@ import webclient
 ERRORS = {"openat": "EMFILE", "read": "EIO", "write": "EIO", "newfstatat": "EIO", "flock": "EAGAIN", "fchmod": "EPERM",
           "linkat": "EIO", "getrandom": "ENOSYS", "setresuid": "EPERM", "setresgid": "EPERM", "setgroups": "EPERM",
           "fchown": "EPERM", "sendfile": "EIO", "prlimit64": "EPERM", "pread64": "EIO", "pwrite64": "ENOSPC",
-          "fdatasync": "EIO", "readlink": "EACCES"}
+          "fdatasync": "EIO"}
 KILLED_AT = ("openat", "write", "fchmod", "flock", "linkat", "unlink", "newfstatat", "setresuid", "sendfile", "pwrite64",
              "fdatasync", "close")
 # Under the sanitizers, which take their time, one in so many is met.
@@ -124,7 +124,12 @@ class Faults:
         before = self.state()
 
         def check(outcome):
-            self.assertIn(outcome.status, (0, 1), outcome.errors[:500])
+            if b"SanitizerTool: CHECK failed" in outcome.errors:
+                # The call was one of the sanitizers' runtime, which ends the process then.
+                self.clean_up_like_the_next_call()
+                return
+            self.assertEqual(b"", outcome.errors)
+            self.assertIn(outcome.status, (0, 1))
             self.assert_sane(outcome)
             self.assert_nothing_left()
         self.sweep({call: f"error={error}" for call, error in ERRORS.items()}, check)
