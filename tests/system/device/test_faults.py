@@ -33,12 +33,18 @@ BEGINNING = re.compile(rb"(?:[^\r\n\0]+: [^\r\n\0]*\r\n)+(\r\n)?", re.DOTALL)
 
 def traced(environment, body, *options):
     """One host program under strace. Its outcome, and the lines of the trace."""
-    with tempfile.NamedTemporaryFile(dir="/dev/shm", mode="r", errors="replace") as trace:
-        # The leak check of the sanitizers and a tracer exclude each other.
+    with (tempfile.NamedTemporaryFile(dir="/dev/shm", mode="r", errors="replace") as trace,
+          tempfile.TemporaryFile(dir="/dev/shm") as sent, tempfile.TemporaryFile(dir="/dev/shm") as answer):
+        sent.write(body)
+        sent.seek(0)
+        # Files in place of pipes, so that the same system calls come in each run. The leak check of the sanitizers and
+        # a tracer exclude each other.
         process = subprocess.run(
             ["strace", "-f", "-qq", "-o", trace.name, "-E", "ASAN_OPTIONS=detect_leaks=0", *options, device.HOST],
-            env=environment, input=body, capture_output=True, cwd=device.FOLDER, timeout=device.TIME_LIMIT, check=False)
-        return host.Outcome(process.stdout, process.stderr, process.returncode), trace.readlines()
+            env=environment, stdin=sent, stdout=answer, stderr=subprocess.PIPE, cwd=device.FOLDER,
+            timeout=device.TIME_LIMIT, check=False)
+        answer.seek(0)
+        return host.Outcome(answer.read(), process.stderr, process.returncode), trace.readlines()
 
 
 def system_calls(environment, body):

@@ -98,6 +98,10 @@ class UploadTestCase(webserver.ServedTestCase):
         self.assertEqual([], part_files())
         super().tearDown()
 
+    def is_heard(self, response):
+        """Whether the answer is the host program's, where that gave it without a look at the body."""
+        return self.answers_early or response.status != 502
+
     def set_volumes(self, volumes):
         os.makedirs(os.path.dirname(VOLUMES), mode=0o700, exist_ok=True)
         with open(VOLUMES, "w", encoding="utf-8") as table:
@@ -165,7 +169,9 @@ class Stored(UploadTestCase):
         self.assertEqual((True, NOBODY), (told["files"]["file"]["opens"], told["files"]["file"]["uid"]))
 
     def test_no_file_stays_after_a_refusal(self):
-        self.assertEqual(1002, post("upload_refused", form(("file", "x", b"content"))).code())
+        response = post("upload_refused", form(("file", "x", b"content")))
+        if self.is_heard(response):
+            self.assertEqual(1002, response.code())
 
     def test_a_slice_is_the_whole_body(self):
         answer = webclient.request("POST", query("upload"), b"\x00raw\r\n--bytes", {
@@ -235,11 +241,13 @@ class Refused(UploadTestCase):
         self.assertEqual((108, -6), upload_error(post("upload", b"")))
 
     def test_a_type_without_a_boundary(self):
-        self.assertEqual((108, -7), upload_error(post("upload", b"x", {"Content-Type": "multipart/form-data"})))
+        response = post("upload", b"x", {"Content-Type": "multipart/form-data"})
+        if self.is_heard(response):
+            self.assertEqual((108, -7), upload_error(response))
 
     def test_a_method_without_uploads(self):
         response = post("granted", form(("file", "x", b"content")))
-        if self.answers_early or response.status != 502:
+        if self.is_heard(response):
             self.assertEqual(115, response.code())
 
     def test_a_plain_body_has_its_limit_still(self):
