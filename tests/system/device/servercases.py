@@ -73,7 +73,8 @@ class Exchange(webserver.ServedTestCase):
     def test_the_host_program_gets_the_query_and_the_headers_that_clients_prove_themselves_by(self):
         query = "x=%0a%00&y=a+b&z=%2F..%2F&w=%zz&v=\"'<>|\\^"
         told = tell({"Authorization": "Basic YTpi", "Proxy": "http://192.0.2.1/"}, query)
-        self.assertEqual(f"api=ZOVA.Test.Probe.Request&version=1&method=tell&{query}", told["variables"]["QUERY_STRING"])
+        self.assertEqual(f"api=ZOVA.Test.Probe.Request&version=1&method=tell&{query}",
+                         told["variables"]["QUERY_STRING"])
         host = urllib.parse.urlsplit(device.URL).netloc
         self.assertEqual(("Basic YTpi", None, host, "127.0.0.1", "/webapi/front.cgi"), tuple(
             told["variables"][name] for name in ("HTTP_AUTHORIZATION", "HTTP_PROXY", "HTTP_HOST", "REMOTE_ADDR",

@@ -1,5 +1,5 @@
-"""Apache with the settings that the project ships: all that holds behind the device's own web server, and its own sending
-of files."""
+"""Apache with the settings that the project ships: all that holds behind the device's own web server, and the
+sending of files by itself."""
 
 import unittest
 

@@ -152,7 +152,8 @@ class Limits(PageTestCase):
                 query = test_downloads.query(path=self.make(name, content))
                 browser.run("location.href = arguments[0];", self.url(query))
                 path = f"{browser.downloads}/{kept}"
-                device.wait_for(lambda path=path, size=len(content): os.path.exists(path) and os.path.getsize(path) == size,
+                size = len(content)
+                device.wait_for(lambda path=path, size=size: os.path.exists(path) and os.path.getsize(path) == size,
                                 "the file")
                 with open(path, "rb") as file:
                     self.assertEqual(content, file.read())

@@ -10,7 +10,6 @@ import unittest
 import urllib.parse
 
 import device
-import probe
 import webclient
 import webserver
 

@@ -24,8 +24,8 @@ ERRORS = {"openat": "EMFILE", "read": "EIO", "write": "EIO", "newfstatat": "EIO"
           "linkat": "EIO", "getrandom": "ENOSYS", "setresuid": "EPERM", "setresgid": "EPERM", "setgroups": "EPERM",
           "fchown": "EPERM", "sendfile": "EIO", "prlimit64": "EPERM", "pread64": "EIO", "pwrite64": "ENOSPC",
           "fdatasync": "EIO"}
-KILLED_AT = ("openat", "write", "fchmod", "flock", "linkat", "unlink", "newfstatat", "setresuid", "sendfile", "pwrite64",
-             "fdatasync", "close")
+KILLED_AT = ("openat", "write", "fchmod", "flock", "linkat", "unlink", "newfstatat", "setresuid", "sendfile",
+             "pwrite64", "fdatasync", "close")
 # Under the sanitizers, which take their time, one in so many is met.
 SANITIZED_STEP = 15
 BEGINNING = re.compile(rb"(?:[^\r\n\0]+: [^\r\n\0]*\r\n)+(\r\n)?", re.DOTALL)
@@ -52,14 +52,14 @@ def system_calls(environment, body):
     _, lines = traced(environment, body)
     counts = collections.Counter()
     found = []
-    isLoaded = False
+    is_loaded = False
     for line in lines:
         if match := re.match(r"\d+ +(\w+)\(", line):
             name = match.group(1)
             counts[name] += 1
             # The last that the loader does is to let go of its list of libraries.
-            isLoaded = isLoaded or name == "munmap"
-            if isLoaded:
+            is_loaded = is_loaded or name == "munmap"
+            if is_loaded:
                 found.append((name, counts[name]))
     return found
 
@@ -158,7 +158,8 @@ class Faults:
 
     def state(self):
         """Of the sessions their names: a use of one shows in its file."""
-        return {entry[0] if entry[0].startswith(device.SESSIONS) else entry for entry in device.watched_files(device.WRITTEN)}
+        return {entry[0] if entry[0].startswith(device.SESSIONS) else entry
+                for entry in device.watched_files(device.WRITTEN)}
 
 
 class UploadFaults(Faults, probe.ProbeTestCase):

@@ -125,10 +125,10 @@ class Agents(probe.ProbeTestCase):
 
     def test_the_desktop_view_is_a_wish_and_no_device(self):
         phone = "Mozilla/5.0 (iPhone) AppleWebKit"
-        for cookie, isMobile in (("forceDesktop=1", False), ("forceDesktop=0", True), ("forceDesktop=yes", True)):
+        for cookie, is_mobile in (("forceDesktop=1", False), ("forceDesktop=0", True), ("forceDesktop=yes", True)):
             with self.subTest(cookie):
                 answers = call("agent", {"User-Agent": phone, "Cookie": cookie}).json()["data"]
-                self.assertEqual(isMobile, "IsMobile" in answers)
+                self.assertEqual(is_mobile, "IsMobile" in answers)
                 self.assertIn("IsMobileDevice", answers)
 
     def test_a_header_of_sixty_thousand_bytes_is_answered(self):

@@ -1,6 +1,7 @@
 """Uploads through the web server: what a method finds, what is refused, and that no part file stays in any case."""
 
 import glob
+import hashlib
 import os
 import signal
 import socket
@@ -212,6 +213,25 @@ class Large(UploadTestCase):
                 # The sanitizers keep memory of their own.
                 if not host.is_sanitized():
                     self.assertLess(large, MOST_MEMORY_KIB)
+
+
+    def test_a_large_file_arrives_with_its_digest(self):
+        with tempfile.TemporaryDirectory(dir="/tmp") as folder, tempfile.NamedTemporaryFile(dir="/var/tmp") as file:
+            os.chown(folder, NOBODY, -1)
+            file.truncate(self.large)
+            # Something to find on both sides of each border.
+            for place in range(0, self.large, (1 << 20) + 1):
+                file.seek(place)
+                file.write(b"\r\n--" + BOUNDARY[:-1].encode() + os.urandom(64))
+            file.flush()
+            subprocess.run(
+                ["curl", "--silent", "--show-error", "--fail", "--form", f"keep={folder}/kept", "--form",
+                 f"file=@{file.name}", "-o", "/dev/null", f"{device.URL}?{query('upload')}"], timeout=600, check=True)
+            digests = []
+            for path in (file.name, f"{folder}/kept"):
+                with open(path, "rb") as content:
+                    digests.append(hashlib.file_digest(content, "sha256").digest())
+            self.assertEqual(*digests)
 
 
 class Refused(UploadTestCase):
