@@ -4,7 +4,7 @@
 BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev libssl-dev libpam0g-dev libsqlite3-dev
     libcurl4-openssl-dev libarchive-dev)
 DEVICE_PACKAGES=(lighttpd lighttpd-mod-openssl busybox curl libarchive13 libcurl4 media-types openssl python3)
-TEST_PACKAGES=(libgtest-dev nodejs)
+TEST_PACKAGES=(libgtest-dev nodejs strace nginx-light fcgiwrap apache2 libapache2-mod-xsendfile chromium chromium-driver)
 CHECK_PACKAGES=(clang-14 clang-format-14 clang-tidy shellcheck)
 export BUILD_PACKAGES DEVICE_PACKAGES TEST_PACKAGES CHECK_PACKAGES
 
@@ -23,7 +23,18 @@ package_is_installed() {
     [[ $(dpkg-query --show --showformat='${db:Status-Abbrev}' "$1" 2>/dev/null) == ii* ]]
 }
 
-# The package of the web server starts a server of its own on port 80. Nobody asked for that one.
+disable_services() {
+    local name
+    for name in "$@"; do
+        case $name in
+            lighttpd | apache2) as_root systemctl disable --quiet "$name.service" ;;
+            nginx-light) as_root systemctl disable --quiet nginx.service ;;
+            fcgiwrap) as_root systemctl disable --quiet fcgiwrap.service fcgiwrap.socket ;;
+        esac
+    done
+}
+
+# The packages of web servers start servers of their own on port 80. Nobody asked for those.
 install_without_services() {
     local policy=/usr/sbin/policy-rc.d made=no status=0
     if [[ ! -e $policy ]]; then
@@ -35,8 +46,8 @@ install_without_services() {
     if [[ $made == yes ]]; then
         as_root rm -f "$policy"
     fi
-    if [[ " $* " == *" lighttpd "* && -d /run/systemd/system ]]; then
-        as_root systemctl disable --quiet lighttpd.service
+    if [[ -d /run/systemd/system ]]; then
+        disable_services "$@"
     fi
     return "$status"
 }

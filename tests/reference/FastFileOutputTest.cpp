@@ -48,6 +48,18 @@ TEST_F(FastFileOutput, StandsBehindTheLocationWhereTheServerMapsPaths) {
     EXPECT_EQ(AnswerOf(kRootsFile).Value("X-Accel-Redirect"), "/inside/files/etc/passwd");
 }
 
+TEST_F(FastFileOutput, EncodesAPathOnlyForTheServerThatIsKnownToDecodeIt) {
+    const std::string odd = "/etc/fast output%\xe2\x82\xac";
+    WriteFile(odd, "content");
+    ASSERT_EQ(chmod(odd.c_str(), 0644), 0);
+    Set("fast_download=\"X-Accel-Redirect\"\nfast_download_location=\"/inside\"\n");
+    EXPECT_EQ(AnswerOf(odd).Value("X-Accel-Redirect"), "/inside/etc/fast%20output%25%E2%82%AC");
+    Set(kSetting);
+    const Sent sent = AnswerOf(odd);
+    EXPECT_EQ(FastLine(sent), "none");
+    EXPECT_EQ(sent.Body(), "content");
+}
+
 TEST_F(FastFileOutput, IsForWholeFilesOfAGetOnly) {
     Set(kSetting);
     const std::string content = ReadWholeFile(kRootsFile);
@@ -58,6 +70,22 @@ TEST_F(FastFileOutput, IsForWholeFilesOfAGetOnly) {
     EXPECT_EQ(FastLine(head), "none");
     EXPECT_EQ(head.Value("Content-Length"), std::to_string(content.size()));
     EXPECT_EQ(FastLine(AnswerOf(kRootsFile, {{"HTTP_IF_NONE_MATCH", "*"}})), "none");
+}
+
+TEST_F(FastFileOutput, IsNotForARequestWithConditionsOrRangesThatTheWebServerWouldJudgeAgain) {
+    Set(kSetting);
+    const std::string tag = AnswerOf(kRootsFile).Value("ETag");
+    for (const auto& [name, value] : {std::pair<const char*, std::string>("HTTP_IF_MATCH", tag),
+                                      {"HTTP_IF_NONE_MATCH", "\"x\""},
+                                      {"HTTP_IF_MODIFIED_SINCE", "Sun, 06 Nov 1994 08:49:37 GMT"},
+                                      {"HTTP_IF_UNMODIFIED_SINCE", "Fri, 31 Dec 2100 23:59:59 GMT"},
+                                      {"HTTP_IF_RANGE", tag},
+                                      {"HTTP_RANGE", "bytes=5-4"}}) {
+        const Sent sent = AnswerOf(kRootsFile, {{name, value}});
+        EXPECT_EQ(FastLine(sent), "none") << name;
+        EXPECT_EQ(sent.Body(), ReadWholeFile(kRootsFile)) << name;
+    }
+    EXPECT_EQ(FastLine(AnswerOf(kRootsFile, {{"REQUEST_METHOD", "POST"}})), "none") << "a whole file of a GET alone";
 }
 
 TEST_F(FastFileOutput, IsOffForTheProcessThatSwitchedItOff) {
@@ -87,13 +115,13 @@ TEST_F(FastFileOutput, IsNotForWhatAnotherThanRootCanExchange) {
     Set(kSetting);
     const std::string folder = "/etc/fast-output-test";
     ASSERT_TRUE(mkdir(folder.c_str(), 0755) == 0 || errno == EEXIST);
-    const std::string file = folder + "/a b%\xe2\x82\xac";
+    const std::string file = folder + "/a-b";
     WriteFile(file, "content");
-    EXPECT_EQ(FastLine(AnswerOf(file)), "/etc/fast-output-test/a%20b%25%E2%82%AC");
+    ASSERT_EQ(chmod(file.c_str(), 0644), 0);
+    EXPECT_EQ(FastLine(AnswerOf(file)), "/etc/fast-output-test/a-b");
     const std::string linked = "/etc/fast-output-link";
     ASSERT_TRUE(symlink(folder.c_str(), linked.c_str()) == 0 || errno == EEXIST);
-    EXPECT_EQ(FastLine(AnswerOf(linked + "/a b%\xe2\x82\xac")), "/etc/fast-output-test/a%20b%25%E2%82%AC")
-        << "where the folder really lies";
+    EXPECT_EQ(FastLine(AnswerOf(linked + "/a-b")), "/etc/fast-output-test/a-b") << "where the folder really lies";
 
     const auto sendsItself = [&](const char* why) {
         const Sent sent = AnswerOf(file);
@@ -117,6 +145,23 @@ TEST_F(FastFileOutput, IsNotForWhatAnotherThanRootCanExchange) {
     EXPECT_NE(FastLine(AnswerOf(file)), "none") << "as before";
 }
 
+TEST_F(FastFileOutput, IsNotForWhatAWebServerWithoutRootsRightsCannotRead) {
+    Set(kSetting);
+    const std::string folder = "/etc/fast-output-private";
+    ASSERT_TRUE(mkdir(folder.c_str(), 0755) == 0 || errno == EEXIST);
+    const std::string file = folder + "/file";
+    WriteFile(file, "content");
+    for (const auto& [fileMode, folderMode, isLeft] :
+         {std::tuple(0644u, 0755u, true), std::tuple(0640u, 0755u, false), std::tuple(0644u, 0750u, false),
+          std::tuple(0644u, 0711u, true)}) {
+        ASSERT_EQ(chmod(file.c_str(), fileMode), 0);
+        ASSERT_EQ(chmod(folder.c_str(), folderMode), 0);
+        const Sent sent = AnswerOf(file);
+        EXPECT_EQ(FastLine(sent) != "none", isLeft) << fileMode << " " << folderMode;
+        EXPECT_EQ(sent.Body(), isLeft ? "" : "content") << fileMode << " " << folderMode;
+    }
+}
+
 TEST_F(FastFileOutput, IsNotForAFileThatIsGoneOrWhoseNameIsNoPlainUtf8) {
     Set(kSetting);
     const std::string file = "/etc/fast-output-gone";
@@ -125,12 +170,14 @@ TEST_F(FastFileOutput, IsNotForAFileThatIsGoneOrWhoseNameIsNoPlainUtf8) {
         FILE* stream = fopen(file.c_str(), "re");
         unlink(file.c_str());
         WriteFile(file, "another");
+        chmod(file.c_str(), 0644);
         return HTTPFileOutputer().Output(stream, "", "a/b");
     });
     EXPECT_EQ(FastLine(gone), "none");
     EXPECT_EQ(gone.Body(), "content");
     for (const std::string odd : {"/etc/fast-output-\xff", "/etc/fast-output-\n", "/etc/fast-output-\x7f"}) {
         WriteFile(odd, "content");
+        ASSERT_EQ(chmod(odd.c_str(), 0644), 0);
         const Sent sent = AnswerOf(odd);
         EXPECT_EQ(FastLine(sent), "none") << odd;
         EXPECT_EQ(sent.Body(), "content") << odd;

@@ -1,12 +1,19 @@
 #include <dirent.h>
 #include <fcntl.h>
+#include <linux/filter.h>
+#include <linux/seccomp.h>
 #include <sys/file.h>
+#include <sys/prctl.h>
+#include <sys/resource.h>
 #include <sys/stat.h>
+#include <sys/syscall.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <cerrno>
 #include <csignal>
+#include <cstddef>
 #include <cstdio>
 #include <cstring>
 #include <vector>
@@ -251,6 +258,28 @@ TEST_F(Upload, ASliceIsOneFile) {
     });
 }
 
+TEST_F(Upload, AFormMayHaveMoreFilesThanTheUsualLimitOfDescriptorsAndTheHardLimitHolds) {
+    std::string input;
+    for (int number = 0; number < 100; ++number) {
+        input += "--b\r\nContent-Disposition: form-data; name=f" + std::to_string(number) + "; filename=x\r\n\r\nx\r\n";
+    }
+    input += "--b--\r\n";
+    for (const auto& [hardLimit, status] :
+         {std::pair(rlim_t{4096}, ZOVA_UPLOAD_COMPLETE), std::pair(rlim_t{64}, ZOVA_UPLOAD_NO_FILE)}) {
+        InUpload(input, std::to_string(input.size()), [&, hardLimit = hardLimit, status = status]() -> std::string {
+            const struct rlimit limit { 64, hardLimit };
+            STATED(setrlimit(RLIMIT_NOFILE, &limit) == 0);
+            Hash params;
+            Hash files;
+            STATED(ZovaCgiLoadUploadAll(&params.all, &files.all, folder.c_str(), 0) == status);
+            STATED(files.all->count == (status == ZOVA_UPLOAD_COMPLETE ? 100 : 0));
+            STATED(status == ZOVA_UPLOAD_COMPLETE || Files().empty());
+            return "";
+        });
+        RemoveFiles();
+    }
+}
+
 TEST_F(Upload, SurvivesNullsInEveryPlace) {
     Hash hash;
     ZovaCgi cgi{};
@@ -369,6 +398,103 @@ TEST_F(Upload, TheSweepRemovesOldFilesThatNobodyHolds) {
     PartFolder(folder.c_str()).Sweep();
     EXPECT_FALSE(Exists(held));
     EXPECT_EQ(Files().size(), 6u);
+}
+
+// ---- a file system on which each file has a name ----
+
+/** From here on no file of this process can be made without a name, as on file systems that do not know it. */
+bool ForbidNamelessFiles() {
+    constexpr unsigned int kNameless = O_TMPFILE & ~O_DIRECTORY;
+    sock_filter steps[] = {
+        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_openat, 0, 3),
+        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, args[2])),
+        BPF_JUMP(BPF_JMP | BPF_JSET | BPF_K, kNameless, 0, 1),
+        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EOPNOTSUPP),
+        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
+    };
+    const sock_fprog program{sizeof(steps) / sizeof(steps[0]), steps};
+    return prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &program) == 0;
+}
+
+/** The same statements, where each file has a name from its beginning. */
+class NamedUpload : public Upload {
+protected:
+    static void InChild(const std::function<std::string()>& body) {
+        EXPECT_EQ(StatusOfChild([&] {
+                      const std::string problem = ForbidNamelessFiles() ? body() : "no filter";
+                      fprintf(stderr, "%s", problem.c_str());
+                      return problem.empty() ? 0 : 1;
+                  }),
+                  0);
+    }
+};
+
+TEST_F(NamedUpload, AFileHasItsNameAtOnceAndLosesItUnlessItIsPublished) {
+    InChild([&]() -> std::string {
+        const PartFolder parts(folder.c_str());
+        {
+            const PartFile dropped(parts);
+            STATED(dropped.IsOpen() && dropped.Write("content"));
+            STATED(Files().size() == 1 && PartFile::IsName(Files()[0]));
+            STATED(ModeOf(folder + "/" + Files()[0]) == 0600);
+        }
+        STATED(Files().empty());
+        PartFile file(parts);
+        PartFile moved(std::move(file));
+        STATED(moved.Write("content"));
+        const std::string path = moved.Publish();
+        STATED(Files().size() == 1 && path == folder + "/" + Files()[0]);
+        STATED(ReadWholeFile(path) == "content");
+        return "";
+    });
+}
+
+TEST_F(NamedUpload, StoresFilesAndKeepsTheLastOfAField) {
+    InUpload(kGood, std::to_string(kGood.size()), [&]() -> std::string {
+        STATED(ForbidNamelessFiles());
+        Hash params;
+        Hash files;
+        STATED(ZovaCgiLoadUploadAll(&params.all, &files.all, folder.c_str(), 0) == ZOVA_UPLOAD_COMPLETE);
+        STATED(files.all->count == 1 && ReadWholeFile(files.all->pairs[0].value) == "second");
+        STATED(Files().size() == 1);
+        return "";
+    });
+}
+
+TEST_F(NamedUpload, LeavesNothingOfABodyThatEndsTooEarly) {
+    const std::string cut = kGood.substr(0, kGood.size() - 10);
+    InUpload(cut, std::to_string(kGood.size()), [&]() -> std::string {
+        STATED(ForbidNamelessFiles());
+        Hash params;
+        Hash files;
+        STATED(ZovaCgiLoadUploadAll(&params.all, &files.all, folder.c_str(), 0) == ZOVA_UPLOAD_CUT_OFF);
+        STATED(files.all->count == 0 && Files().empty());
+        return "";
+    });
+}
+
+TEST_F(NamedUpload, WhatAKilledProcessLeftGoesWithTheSweepAndWhatALiveOneHoldsStays) {
+    EXPECT_EQ(StatusOfChild([&] {
+                  const PartFolder parts(folder.c_str());
+                  const bool hasFilter = ForbidNamelessFiles();
+                  const PartFile file(parts);
+                  return hasFilter && file.IsOpen() ? raise(SIGKILL) : 1;
+              }),
+              -1);
+    ASSERT_EQ(Files().size(), 1u);
+    const std::string left = folder + "/" + Files()[0];
+    InChild([&]() -> std::string {
+        const PartFolder parts(folder.c_str());
+        const PartFile held(parts);
+        for (const std::string& name : Files()) {
+            MakeOlder(folder + "/" + name, 61);
+        }
+        parts.Sweep();
+        STATED(Files().size() == 1 && folder + "/" + Files()[0] != left);
+        return "";
+    });
+    EXPECT_TRUE(Files().empty());
 }
 
 // ---- the string hash, the error code and the volumes ----

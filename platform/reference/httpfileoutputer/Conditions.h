@@ -28,6 +28,11 @@ struct Conditions {
     std::string_view modifiedSince;
     std::string_view unmodifiedSince;
     std::string_view ifRange;
+
+    bool AreNone() const {
+        return match.empty() && noneMatch.empty() && modifiedSince.empty() && unmodifiedSince.empty() &&
+               ifRange.empty();
+    }
 };
 
 enum class Verdict {

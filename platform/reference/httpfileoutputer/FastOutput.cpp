@@ -17,6 +17,8 @@ namespace reference {
 
 namespace {
 
+constexpr std::string_view kSendfile = "X-Sendfile";
+
 /** Read at the first question; what a method sets afterwards holds for the process. */
 std::optional<bool> isEnabled;
 
@@ -52,8 +54,8 @@ std::string PathOf(int file) {
                : "";
 }
 
-bool OnlyRootWrites(const struct stat& status) {
-    return status.st_uid == 0 && (status.st_mode & 022) == 0;
+bool OnlyRootWritesAndAllRead(const struct stat& status) {
+    return status.st_uid == 0 && (status.st_mode & 022) == 0 && (status.st_mode & S_IROTH) != 0;
 }
 
 /** In a folder like /tmp, in which each may change their own only, what is root's stays as it is. */
@@ -62,23 +64,27 @@ bool KeepsWhatIsRoots(const struct stat& folder) {
            ((folder.st_mode & 022) == 0 || (folder.st_mode & S_ISVTX) != 0);
 }
 
-/** Whether root alone can change which file the path leads to, and the file itself. */
-bool OnlyRootDecides(const std::string& path, const struct stat& file) {
+bool IsOpenToAll(const struct stat& folder) {
+    return (folder.st_mode & S_IXOTH) != 0;
+}
+
+/** Whether root alone can change which file the path leads to, and the file itself, and everybody can read it. */
+bool IsTheSameForAll(const std::string& path, const struct stat& file) {
     struct stat status;
     for (size_t slash = 0; slash != std::string::npos; slash = path.find('/', slash + 1)) {
         const std::string folder = slash == 0 ? "/" : path.substr(0, slash);
-        if (lstat(folder.c_str(), &status) != 0 || !KeepsWhatIsRoots(status)) {
+        if (lstat(folder.c_str(), &status) != 0 || !KeepsWhatIsRoots(status) || !IsOpenToAll(status)) {
             return false;
         }
     }
     return lstat(path.c_str(), &status) == 0 && status.st_dev == file.st_dev && status.st_ino == file.st_ino &&
-           OnlyRootWrites(status);
+           OnlyRootWritesAndAllRead(status);
 }
 
 }  // namespace
 
 FastOutput ReadFastOutput(std::string_view header, std::string_view location) {
-    if (header == "X-Sendfile") {
+    if (header == kSendfile) {
         return {std::string(header), ""};
     }
     if (header == "X-Accel-Redirect" && IsLocation(location)) {
@@ -95,11 +101,16 @@ std::string FastOutputLine(int file) {
     const std::string path = PathOf(file);
     // Web servers refuse names that are no UTF-8, and look for another file where a name holds control bytes.
     if (path.empty() || !IsUtf8(path) || HasControlByte(path) || fstat(file, &status) != 0 ||
-        !OnlyRootDecides(path, status)) {
+        !IsTheSameForAll(path, status)) {
         return "";
     }
     const FastOutput& device = DeviceFastOutput();
-    return device.header + ": " + device.location + PercentText(path, "/");
+    const std::string text = PercentText(path, "/");
+    // Some web servers take the path of this header as it stands, others decode it.
+    if (device.header == kSendfile && text != path) {
+        return "";
+    }
+    return device.header + ": " + device.location + text;
 }
 
 }  // namespace reference

@@ -19,7 +19,7 @@ FastOutput ReadFastOutput(std::string_view header, std::string_view location);
 /**
  * The header line, without its end, that makes the web server send the file that is open here; empty if this process
  * has to send it itself. The web server opens the file anew, by its path and with rights of its own. So it is left to
- * it only if the path leads to this very file and nobody but root can change where it leads.
+ * it only if the path leads to this very file, nobody but root can change where it leads, and everybody may read it.
  */
 std::string FastOutputLine(int file);
 

@@ -17,8 +17,8 @@ namespace reference {
 class MultipartDecoder {
 public:
     static constexpr size_t kLongestBoundary = 70;
-    static constexpr size_t kMostParts = 1000;
-    static constexpr size_t kMostFiles = 500;
+    static constexpr size_t kMostParts = 2000;
+    static constexpr size_t kMostFiles = 1000;
     /** Lengths in bytes: header lines of one part, name of a field, client's name of a file, all values together. */
     static constexpr size_t kLongestHeaders = 8192;
     static constexpr size_t kLongestName = 63;

@@ -1,5 +1,7 @@
+#include <sys/resource.h>
 #include <syslog.h>
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <exception>
@@ -122,8 +124,22 @@ int Publish(std::vector<StoredPart>& parts, ZovaSzHash** files) {
     return ZOVA_UPLOAD_COMPLETE;
 }
 
+/**
+ * Each part file stays open until the process ends, and the usual limit of 1,024 descriptors is no more than the
+ * largest form has files. The hard limit holds.
+ */
+void AllowDescriptors() {
+    constexpr rlim_t kWanted = reference::MultipartDecoder::kMostFiles + 1024;
+    struct rlimit limit;
+    if (getrlimit(RLIMIT_NOFILE, &limit) == 0 && limit.rlim_cur < kWanted) {
+        limit.rlim_cur = std::min(kWanted, limit.rlim_max);
+        setrlimit(RLIMIT_NOFILE, &limit);
+    }
+}
+
 int LoadAll(UploadBody& body, ZovaSzHash** params, ZovaSzHash** files, const PartFolder& folder) {
     std::vector<StoredPart> parts;
+    AllowDescriptors();
     while (body.Status() != ZOVA_UPLOAD_COMPLETE) {
         const int fields = body.IsInFile() ? 0 : ReadFields(body, params, kAllFields);
         if (fields < 0) {

@@ -20,16 +20,18 @@ URL = os.environ["WEBAPI_URL"]
 PASSWORD = os.environ["WEBAPI_PASSWORD"]
 
 WATCHED = ("/etc", "/home", "/root", "/run", "/tmp", "/usr/lib/zova", "/usr/zova", "/var")
+# Of these, what a call of a shipped package or of the probe could write: soon looked through.
+WRITTEN = ("/etc/zova", "/home", "/run", "/tmp", "/usr/zova", "/var/lib/zova", "/var/tmp")
 # The project may lie under a watched folder, and with it the layer that the device itself is kept in.
 PROJECT = os.path.dirname(os.path.dirname(os.path.dirname(os.path.dirname(os.path.abspath(__file__)))))
 # Logs, and the counts of login attempts, are written whatever the call.
 PASSED_OVER = (LOGS, FAILURES, PROJECT)
 
 
-def watched_files():
+def watched_files(tops=WATCHED):
     """Path, kind, size and time of change of all that a call could write, as a set of tuples."""
     found = set()
-    for top in WATCHED:
+    for top in tops:
         for folder, folders, files in os.walk(top):
             if folder in PASSED_OVER:
                 folders.clear()

@@ -14,10 +14,15 @@ PLACES = {
 }
 
 
+def install(case):
+    """Until the class cleanup of the test case."""
+    for source, place in PLACES.items():
+        shutil.copyfile(source, place)
+        case.addClassCleanup(os.unlink, place)
+
+
 class ProbeTestCase(device.DeviceTestCase):
     @classmethod
     def setUpClass(cls):
         super().setUpClass()
-        for source, place in PLACES.items():
-            shutil.copyfile(source, place)
-            cls.addClassCleanup(os.unlink, place)
+        install(cls)

@@ -49,7 +49,9 @@ class Visitor(webclient.Client):
         return self.call(API, "read", path=path)
 
 
-class Sharing(device.DeviceTestCase):
+class SharingTestCase(device.DeviceTestCase):
+    """With the package and its project, an album of alice's, and no link yet."""
+
     @classmethod
     def setUpClass(cls):
         super().setUpClass()
@@ -98,6 +100,8 @@ class Sharing(device.DeviceTestCase):
         with contextlib.closing(sqlite3.connect(DATABASE)) as database, database:
             database.execute(statement, values)
 
+
+class Sharing(SharingTestCase):
     # ---- who gets through ----
 
     def test_a_visitor_reads_what_a_public_link_shares_without_a_login(self):

@@ -13,6 +13,7 @@
 #include <stdexcept>
 
 #include "ProbeDownload.h"
+#include "ProbeRequest.h"
 #include "ProbeUpload.h"
 #include "ProcessState.h"
 
@@ -147,6 +148,7 @@ bool ThrowInACheck(ZOVA::APIRequest*, ZOVA::APIResponse*) {
 constexpr const char* kAPI = "ZOVA.Test.Probe";
 constexpr const char* kDaemonAPI = "ZOVA.Test.Probe.Daemon";
 constexpr const char* kDownloadAPI = "ZOVA.Test.Probe.Download";
+constexpr const char* kRequestAPI = "ZOVA.Test.Probe.Request";
 
 const ZOVA::_tag_API_TABLE kTable[] = {
     {kAPI, 1, "granted", Tell},
@@ -180,6 +182,9 @@ const ZOVA::_tag_API_TABLE kTable[] = {
     {kDownloadAPI, 1, "path", probe::SendPath},
     {kDownloadAPI, 1, "stream", probe::SendStream},
     {kDownloadAPI, 1, "pipe", probe::SendPipe},
+    {kRequestAPI, 1, "agent", probe::TellAgent},
+    {kRequestAPI, 1, "checks", probe::TellChecks},
+    {kRequestAPI, 1, "tell", probe::TellRequest},
     {nullptr, 0, nullptr, nullptr},
 };
 

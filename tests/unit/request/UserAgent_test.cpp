@@ -301,6 +301,87 @@ INSTANTIATE_TEST_SUITE_P(
         HeaderCase{"OkHttpDoesNotTell", "okhttp/4.12.0", ""}),
     kName);
 
+INSTANTIATE_TEST_SUITE_P(
+    ClientsOf2026, Headers,
+    ::testing::Values(
+        HeaderCase{"SafariOnAnIPhoneWithFrozenSystemVersion",
+                   "Mozilla/5.0 (iPhone; CPU iPhone OS 18_7 like Mac OS X) AppleWebKit/605.1.15 (KHTML, like Gecko) "
+                   "Version/26.1 Mobile/15E148 Safari/604.1",
+                   "Mobile MobileDevice IPhone WebKit SupportWebApp"},
+        HeaderCase{"FirefoxOnAnIPhone",
+                   "Mozilla/5.0 (iPhone; CPU iPhone OS 18_7 like Mac OS X) AppleWebKit/605.1.15 (KHTML, like Gecko) "
+                   "FxiOS/150.0 Mobile/15E148 Safari/605.1.15",
+                   "Mobile MobileDevice IPhone WebKit SupportWebApp"},
+        HeaderCase{"ChromeOnAnIPad",
+                   "Mozilla/5.0 (iPad; CPU OS 18_7 like Mac OS X) AppleWebKit/605.1.15 (KHTML, like Gecko) "
+                   "CriOS/148.0.7778.42 Mobile/15E148 Safari/604.1",
+                   "Mobile MobileDevice IPhone IPad WebKit SupportWebApp"},
+        HeaderCase{"SafariOnAHeadsetCallsItselfAMac",
+                   "Mozilla/5.0 (Macintosh; Intel Mac OS X 10_15_7) AppleWebKit/605.1.15 (KHTML, like Gecko) "
+                   "Version/26.1 Safari/605.1.15",
+                   "WebKit"},
+        HeaderCase{"ReducedChromeOnAPhone",
+                   "Mozilla/5.0 (Linux; Android 10; K) AppleWebKit/537.36 (KHTML, like Gecko) Chrome/148.0.0.0 Mobile "
+                   "Safari/537.36",
+                   "Mobile MobileDevice Android WebKit SupportWebApp"},
+        HeaderCase{"ReducedChromeOnATablet",
+                   "Mozilla/5.0 (Linux; Android 10; K) AppleWebKit/537.36 (KHTML, like Gecko) Chrome/148.0.0.0 "
+                   "Safari/537.36",
+                   "Mobile MobileDevice Android WebKit SupportWebApp"},
+        HeaderCase{"ChromeOnATabletThatAsksForDesktopPages",
+                   "Mozilla/5.0 (X11; Linux x86_64) AppleWebKit/537.36 (KHTML, like Gecko) Chrome/148.0.0.0 "
+                   "Safari/537.36",
+                   "WebKit"},
+        HeaderCase{"SamsungInternet",
+                   "Mozilla/5.0 (Linux; Android 10; K) AppleWebKit/537.36 (KHTML, like Gecko) SamsungBrowser/29.0 "
+                   "Chrome/136.0.0.0 Mobile Safari/537.36",
+                   "Mobile MobileDevice Android WebKit SupportWebApp"},
+        HeaderCase{"AViewInAnAndroidApp",
+                   "Mozilla/5.0 (Linux; Android 16; Pixel 10 Build/BP3A.250905.014; wv) AppleWebKit/537.36 (KHTML, "
+                   "like Gecko) Version/4.0 Chrome/148.0.7778.60 Mobile Safari/537.36",
+                   "Mobile MobileDevice Android WebKit SupportWebApp"},
+        HeaderCase{"FirefoxOnAnAndroidPhone", "Mozilla/5.0 (Android 16; Mobile; rv:150.0) Gecko/150.0 Firefox/150.0",
+                   "Mobile MobileDevice Android"},
+        HeaderCase{"HarmonyOSIsTakenForADesktop",
+                   "Mozilla/5.0 (Phone; OpenHarmony 5.0) AppleWebKit/537.36 (KHTML, like Gecko) Chrome/114.0.0.0 "
+                   "Safari/537.36 ArkWeb/4.1.6.1 Mobile",
+                   "WebKit"},
+        HeaderCase{"EdgeOnWindows",
+                   "Mozilla/5.0 (Windows NT 10.0; Win64; x64) AppleWebKit/537.36 (KHTML, like Gecko) Chrome/148.0.0.0 "
+                   "Safari/537.36 Edg/148.0.0.0",
+                   "WebKit"},
+        HeaderCase{"FirefoxOnAMac",
+                   "Mozilla/5.0 (Macintosh; Intel Mac OS X 10.15; rv:150.0) Gecko/20100101 Firefox/150.0", ""},
+        HeaderCase{"HeadlessChrome",
+                   "Mozilla/5.0 (X11; Linux x86_64) AppleWebKit/537.36 (KHTML, like Gecko) HeadlessChrome/148.0.0.0 "
+                   "Safari/537.36",
+                   "WebKit"},
+        HeaderCase{"ATizenTelevisionOf2025",
+                   "Mozilla/5.0 (SMART-TV; LINUX; Tizen 9.0) AppleWebKit/537.36 (KHTML, like Gecko) Version/9.0 "
+                   "Chrome/120.0.6099.5 TV Safari/537.36",
+                   "WebKit"},
+        HeaderCase{"AWebOSTelevisionOf2025",
+                   "Mozilla/5.0 (Web0S; Linux/SmartTV) AppleWebKit/537.36 (KHTML, like Gecko) Chrome/120.0.6099.270 "
+                   "Safari/537.36 WebAppManager",
+                   "WebKit"},
+        HeaderCase{"ATelevisionStickWithAndroid",
+                   "Mozilla/5.0 (Linux; Android 11; AFTKRT Build/RS8101; wv) AppleWebKit/537.36 (KHTML, like Gecko) "
+                   "Version/4.0 Chrome/128.0.6613.187 Mobile Safari/537.36",
+                   "Mobile MobileDevice Android WebKit SupportWebApp"},
+        HeaderCase{"TheBotOfALanguageModel",
+                   "Mozilla/5.0 AppleWebKit/537.36 (KHTML, like Gecko; compatible; GPTBot/1.3; "
+                   "+https://openai.com/gptbot)",
+                   "WebKit"},
+        HeaderCase{"ABotThatPreviewsLinks", "facebookexternalhit/1.1 (+http://www.facebook.com/externalhit_uatext.php)",
+                   ""},
+        HeaderCase{"TheBotOfAPhone",
+                   "Mozilla/5.0 (Macintosh; Intel Mac OS X 10_15_5) AppleWebKit/605.1.15 (KHTML, like Gecko) "
+                   "Version/13.1.1 Safari/605.1.15 (Applebot/0.1; +http://www.apple.com/go/applebot)",
+                   "WebKit"},
+        HeaderCase{"AnIPhoneAppWithCFNetwork", "Example/26.1 CFNetwork/3860.200.71 Darwin/25.1.0", ""},
+        HeaderCase{"GoHttpClient", "Go-http-client/2.0", ""}),
+    kName);
+
 // ---- the other headers ----
 
 TEST_F(UserAgentTest, WithoutAHeaderEverythingIsFalseEvenWithAProfile) {
