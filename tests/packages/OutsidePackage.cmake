@@ -43,7 +43,8 @@ run(${CMAKE_COMMAND} -S ${SOURCE} -B ${WORK}/build -D CMAKE_BUILD_TYPE=Debug -D 
 run(${CMAKE_COMMAND} --build ${WORK}/build)
 run(${CMAKE_COMMAND} -E env DESTDIR=${WORK}/device ${CMAKE_COMMAND} --install ${WORK}/build --prefix /usr)
 set(installed ${WORK}/device/usr/lib/zova/webapi/Example.Greeting.so)
-check_exists(${installed} ${WORK}/device/usr/zova/zovaman/webapi/Example.Greeting.lib)
+check_exists(${installed} ${WORK}/device/usr/zova/zovaman/webapi/Example.Greeting.lib
+    ${WORK}/device/usr/lib/sharing/permission_lib/example.so)
 run(${WORK}/build/call-greeting ${installed})
 check_answer()
 
