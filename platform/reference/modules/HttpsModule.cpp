@@ -6,9 +6,11 @@
 #include <strings.h>
 
 #include <algorithm>
+#include <charconv>
 #include <ctime>
 #include <initializer_list>
 #include <memory>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -42,8 +44,13 @@ struct Exchange {
     curl_off_t sent = 0;
     size_t headerBytes = 0;
     bool answerBegun = false;
-    /** Whether the answer says where it ends. */
+    bool bodyBegun = false;
+    /** Whether the answer says where it ends; in bytes, if it has its end from a length. */
     bool isFramed = false;
+    std::optional<uint64_t> length;
+    uint64_t received = 0;
+    /** The answer has come whole, and the transfer was ended for that. */
+    bool isComplete = false;
     /** Why a function below ended the transfer. */
     ZovaHttpsResult stopped = ZOVA_HTTPS_GOOD;
 };
@@ -66,14 +73,25 @@ size_t Read(char* buffer, size_t size, size_t count, void* data) {
     return static_cast<size_t>(got);
 }
 
-/** Whether the header line names a length or a coding with an end of its own. */
-bool SaysWhereItEnds(std::string_view line) {
+/** Notes what the header line says of the answer's end: a length, or a coding with an end of its own, which wins. */
+void NoteEnd(std::string_view line, Exchange& exchange) {
     constexpr std::string_view kLength = "content-length:";
     constexpr std::string_view kCoding = "transfer-encoding:";
     const auto begins = [&](std::string_view name) {
         return line.size() > name.size() && strncasecmp(line.data(), name.data(), name.size()) == 0;
     };
-    return begins(kLength) || (begins(kCoding) && line.find("chunked") != std::string_view::npos);
+    if (begins(kCoding) && line.find("chunked") != std::string_view::npos) {
+        exchange.isFramed = true;
+        exchange.length.reset();
+    } else if (begins(kLength)) {
+        line.remove_prefix(std::min(line.find_first_not_of(" \t", kLength.size()), line.size()));
+        uint64_t length = 0;
+        const auto parsed = std::from_chars(line.data(), line.data() + line.size(), length);
+        if (parsed.ec == std::errc() && !exchange.isFramed) {
+            exchange.length = length;
+        }
+        exchange.isFramed = true;
+    }
 }
 
 size_t WriteHeader(char* line, size_t size, size_t count, void* data) {
@@ -88,8 +106,10 @@ size_t WriteHeader(char* line, size_t size, size_t count, void* data) {
     if (text.substr(0, kProtocol.size()) == kProtocol) {
         exchange.answerBegun = text.substr(0, kInterim.size()) != kInterim;
         exchange.isFramed = false;
+        exchange.length.reset();
     }
-    exchange.isFramed = exchange.isFramed || SaysWhereItEnds(text);
+    NoteEnd(text, exchange);
+    exchange.bodyBegun = exchange.answerBegun && text == "\r\n";
     return length;
 }
 
@@ -99,15 +119,23 @@ size_t WriteBody(char* bytes, size_t size, size_t count, void* data) {
         exchange.stopped = ZOVA_HTTPS_TOO_LARGE;
         return 0;
     }
+    exchange.received += size * count;
     return size * count;
 }
 
-/** Called at least once a second: ends a transfer that takes too long. */
+/**
+ * Called at least once a second: ends a transfer that takes too long, and one whose answer is there. libcurl would
+ * first send what it has of the body, which a peer that has answered need not take.
+ */
 int Watch(void* data, curl_off_t, curl_off_t, curl_off_t, curl_off_t sent) {
     auto& exchange = *static_cast<Exchange*>(data);
     if (sent != exchange.sent) {
         exchange.sent = sent;
         exchange.lastSent = Now();
+    }
+    if (exchange.bodyBegun && exchange.length == exchange.received) {
+        exchange.isComplete = true;
+        return 1;
     }
     const bool isSent = exchange.left == 0 || exchange.answerBegun;
     const time_t limit = isSent ? exchange.request.answerSeconds : kStallSeconds;
@@ -224,9 +252,13 @@ int ZovaHttpsPost(const ZovaHttpsRequest* request, long* status) {
     if (exchange.stopped != ZOVA_HTTPS_GOOD) {
         return exchange.stopped;
     }
-    if (code == CURLE_OK && curl_easy_getinfo(handle.get(), CURLINFO_RESPONSE_CODE, status) != CURLE_OK) {
+    const bool isWhole = code == CURLE_OK || (code == CURLE_ABORTED_BY_CALLBACK && exchange.isComplete);
+    if (isWhole && curl_easy_getinfo(handle.get(), CURLINFO_RESPONSE_CODE, status) != CURLE_OK) {
         return ZOVA_HTTPS_FAILED;
     }
     // An end of the connection alone may be anybody's doing: libcurl does not ask for the closing word of TLS.
-    return code == CURLE_OK && !exchange.isFramed ? ZOVA_HTTPS_BROKEN : ResultOf(code);
+    if (isWhole) {
+        return exchange.isFramed ? ZOVA_HTTPS_GOOD : ZOVA_HTTPS_BROKEN;
+    }
+    return ResultOf(code);
 }

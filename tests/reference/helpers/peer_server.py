@@ -16,6 +16,7 @@ by a signal, or after ten minutes.
     /garbage    no HTTP             /close      nothing at all
     /short      less than announced /chunk      a chunked body without its end
     /cut        a body without a length, and an end that TLS does not confirm
+    /full       the same, once the buffers between the two have had time to fill
     /early      the answer before the body, which is never read; the connection stays open for 5 s
     /gone       the connection ends before the body is read
 """
@@ -132,7 +133,9 @@ class Handler(socketserver.BaseRequestHandler):
             return
         self.read_head()
         path = self.target.partition("?")[0]
-        if path == "/early":
+        if path == "/full":
+            time.sleep(0.5)
+        if path in ("/early", "/full"):
             self.request.sendall(b'HTTP/1.1 200 OK\r\nContent-Length: 14\r\n\r\n{"early":true}')
             time.sleep(5)
             return
