@@ -5,7 +5,7 @@ BUILD_PACKAGES=(g++ cmake ninja-build pkg-config libjsoncpp-dev libapparmor-dev 
     libcurl4-openssl-dev libarchive-dev)
 DEVICE_PACKAGES=(lighttpd lighttpd-mod-openssl busybox curl libarchive13 libcurl4 media-types openssl python3)
 TEST_PACKAGES=(libgtest-dev nodejs strace nginx-light fcgiwrap apache2 libapache2-mod-xsendfile chromium chromium-driver)
-CHECK_PACKAGES=(clang-14 clang-format-14 clang-tidy shellcheck)
+CHECK_PACKAGES=(clang-14 clang-format-14 clang-tidy libclang-rt-14-dev llvm-14 shellcheck)
 export BUILD_PACKAGES DEVICE_PACKAGES TEST_PACKAGES CHECK_PACKAGES
 
 as_root() {

@@ -1,5 +1,5 @@
 #!/usr/bin/env python3
-"""Adds up what the test programs left: count_results.py RESULTS [FILTER]. Prints "N passed, N failed" as its only line.
+"""Adds up what the test programs left: count_results.py RESULTS FILTER PART... Prints "N passed, N failed" as its only line.
 
 A part that left no result was cut off, and counts as one failure. So does a test that ctest did not run. Ends with 1 if
 anything failed or nothing ran.
@@ -32,9 +32,9 @@ def of_counts(path):
 
 def main():
     results = sys.argv[1]
-    filtered = len(sys.argv) > 2 and sys.argv[2] != ""
+    filtered = sys.argv[2] != ""
     parts = [of_ctest(f"{results}/ctest.xml", filtered)]
-    parts += [of_counts(f"{results}/{part}") for part in ("gtest", "machine", "device", "peers")]
+    parts += [of_counts(f"{results}/{part}") for part in sys.argv[3:]]
     passed = sum(part[0] for part in parts)
     failed = sum(part[1] for part in parts)
     print(f"{passed} passed, {failed} failed")

@@ -60,6 +60,18 @@ class Reader:
         self.connection.close()
 
 
+def room_of_web_server():
+    """Bytes on the disk in the files that lighttpd holds."""
+    room = 0
+    for name in os.listdir(PARTS):
+        if name.startswith("lighttpd-upload"):
+            try:
+                room += os.stat(os.path.join(PARTS, name)).st_blocks * 512
+            except FileNotFoundError:
+                pass  # gone meanwhile
+    return room
+
+
 class Downloads(webserver.ServedTestCase):
     large = 300 << 20
     # The line of the response, which a method replaces if it wants another, comes first; the last one counts.
@@ -264,8 +276,8 @@ class Downloads(webserver.ServedTestCase):
         reader = Reader(query(path=path))
         reader.read(1_000_000)
         host = device.wait_for(device.hosts_running, "the host program sends")[0]
-        # It waits for the client, whatever the length of the file.
-        self.assertEqual([], [name for name in os.listdir(PARTS) if name.startswith("lighttpd-upload")])
+        # It waits for the client, whatever the length of the file: lighttpd may put a piece aside, not the whole.
+        self.assertLess(room_of_web_server(), 8 << 20)
         digest = hashlib.sha256(bytes(1_000_000))
         left = size - 1_000_000
         peak = 0
