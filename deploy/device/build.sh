@@ -22,8 +22,9 @@ build_device() {
     fi
 }
 
+# build_with_tests PRESET [ON|OFF]: with the test programs, or only what the tests of the whole system need.
 build_with_tests() {
-    _build_preset "$1" all -DWEBAPI_TESTS=ON
+    _build_preset "$1" all -DWEBAPI_TESTS=ON -DWEBAPI_UNIT_TESTS="${2:-ON}"
 }
 
 build_fuzz_targets() {
