@@ -458,7 +458,11 @@ TEST_F(Relay, ABodyOfAnySizeNeedsNoMemory) {
     const Outcome outcome = Upload("/count", sparse, Headers(std::to_string(size)));
     ASSERT_TRUE(outcome.IsGood()) << outcome;
     EXPECT_EQ(Parsed(outcome)["length"].asInt64(), size);
-    // The sanitizers keep what has been given back for a while.
-    EXPECT_LT(memory() - before, 32768);
+#ifdef __SANITIZE_ADDRESS__
+    constexpr long kMost = 32768;  // what has been given back is kept for a while
+#else
+    constexpr long kMost = 2048;
+#endif
+    EXPECT_LT(memory() - before, kMost);
     fclose(sparse);
 }
